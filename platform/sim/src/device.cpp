@@ -1,0 +1,73 @@
+// The control interface of the simulated device.
+#include "sim/device.h"
+
+#include <errno.h>
+#include <stdlib.h>
+#include <string.h>
+#include <sys/stat.h>
+
+#include "state.h"
+
+namespace sim {
+
+const char kLauncherDataDir[] = "/opt/usr/apps/com.velmora.korrin/data";
+
+namespace {
+
+bool EchoRequestedByEnvironment() {
+  const char* value = getenv("KORRIN_SIM_LOG");
+  return value != NULL && strcmp(value, "stderr") == 0;
+}
+
+bool MakeDirs(const std::string& path) {
+  for (size_t slash = path.find('/', 1);; slash = path.find('/', slash + 1)) {
+    std::string prefix = path.substr(0, slash);
+    if (!prefix.empty() && mkdir(prefix.c_str(), 0755) != 0 && errno != EEXIST) return false;
+    if (slash == std::string::npos) return true;
+  }
+}
+
+}  // namespace
+
+State& TheState() {
+  static State* state = NULL;
+  if (state == NULL) {
+    state = new State;  // never destroyed: the engine may log from static destructors
+    state->echoLogs = EchoRequestedByEnvironment();
+  }
+  return *state;
+}
+
+Device::Device() {}
+
+Device& Device::Get() {
+  static Device device;
+  return device;
+}
+
+void Device::Reset() {
+  State& state = TheState();
+  bool echo = state.echoLogs;
+  state = State();
+  state.echoLogs = echo;
+}
+
+bool Device::UseRoot(const std::string& dir) {
+  if (dir.empty() || !MakeDirs(dir + kLauncherDataDir)) return false;
+  return setenv("KORRIN_SIM_ROOT", dir.c_str(), 1) == 0;
+}
+
+std::string Device::Root() const {
+  const char* root = getenv("KORRIN_SIM_ROOT");
+  return root != NULL ? root : "";
+}
+
+std::string Device::HostPath(const std::string& devicePath) const { return Root() + devicePath; }
+
+const std::vector<LogLine>& Device::Logs() const { return TheState().logs; }
+
+void Device::ClearLogs() { TheState().logs.clear(); }
+
+void Device::EchoLogs(bool on) { TheState().echoLogs = on; }
+
+}  // namespace sim
