@@ -42,6 +42,87 @@ class LauncherDataManager {
   bool CommitTransaction();
   bool RollbackTransaction();
 
+  // ---- Menus (table Menus).
+
+  // Stores |menu| (an empty name as NULL). Returns the new menuId, also
+  // written into |menu|, or -1 when the statement does not compile.
+  int InsertMenuData(GameViewData& menu);
+  // The menu, or a record with menuId 0 and type -1 when there is none.
+  boost::shared_ptr<GameViewData> GetMenuData(int menuId);
+  // Writes name and type by menuId; true once the statement ran, found or not.
+  bool UpdateMenuData(GameViewData& menu);
+  // Deletes the menu row only; its pages and boxes stay.
+  bool DeleteMenuData(int menuId);
+  int GetMenuDataCount();
+  // All menus, newest first.
+  std::vector<boost::shared_ptr<GameViewData> > GetMenuDataList();
+
+  // ---- Pages (table Pages).
+
+  // Returns the new pageId, also written into |page|, or -1.
+  int InsertPageData(GamePageData& page);
+  // Writes parentId and pageNo by pageId; a page never changes its isFolder.
+  bool UpdatePageData(GamePageData& page);
+  // Deletes one page row; its boxes stay.
+  bool DeletePageData(int pageId);
+  // Deletes every page whose parentId is |folderBoxId|, menu pages included.
+  bool DeleteFolderPageData(int folderBoxId);
+  // The page, or a record with pageId 0 when there is none.
+  boost::shared_ptr<GamePageData> GetMenuPageData(int pageId);
+  // Always 0: the launcher's statement for it never compiles, and first launch
+  // relies on that answer.
+  int GetPageDataCount(int menuId, bool isFolder);
+  // Application boxes not preloaded, over the whole database; |menuId| unused.
+  int _GetPageDataCountByDownload(int menuId);
+
+  // Fixed answers, so the host may call the alphabetical forms like the others.
+  int InsertPageDataForAlphaBeticalOrder(GamePageData& page);   // -1
+  bool UpdatePageDataForAlphaBeticalOrder(GamePageData& page);  // false
+  bool DeletePageDataForAlphaBeticalOrder(int pageId);          // false
+
+  // ---- Boxes (table Boxes). Each statement has a folder form, a form for a
+  // box of type 3 (with its own name, icon path and content) and a form for
+  // any other application box (only its appId and place are stored).
+
+  // Returns the new boxId, also written into |box|, or -1.
+  int InsertBoxData(GameBoxData& box);
+  // Writes the box by boxId. Always true, also when the statement fails.
+  bool UpdateBoxData(GameBoxData& box);
+  // Deletes one box; a folder's pages stay. Logs a failure.
+  bool DeleteBoxData(int boxId);
+  // The box, or a record with boxId 0 when there is none or its page is gone.
+  boost::shared_ptr<GameBoxData> GetMenuBoxData(int boxId);
+  // Finds the application's box (never one of type 3). Writes the owner of its
+  // page, its page and its id, and returns true; returns false and writes
+  // nothing when there is none.
+  bool GetBoxIdByAppId(std::string appId, int* parentId, int* pageId, int* boxId);
+  // The application's box (never one of type 3), or a record with boxId 0,
+  // logged, when there is none.
+  boost::shared_ptr<GameBoxData> GetBoxDataByAppId(std::string appId);
+  // Boxes on the page, folders included.
+  int GetBoxDataCount(int pageId);
+
+  // ---- Listings, in layout order. Empty on failure.
+
+  // Pages of a menu (isFolder false, |parentId| a menuId) or of a folder
+  // (isFolder true, |parentId| its boxId), by pageNo.
+  std::vector<boost::shared_ptr<GamePageData> > GetPageDataList(int parentId, bool isFolder);
+  // Boxes of a stored page, by row then col.
+  std::vector<boost::shared_ptr<GameBoxData> > GetBoxDataList(int pageId);
+  // Every box of the application with |boxType|, on any page, by row then col.
+  std::vector<boost::shared_ptr<GameBoxData> > GetBoxDataListByAppId(std::string appId,
+                                                                     int boxType);
+
+  // ---- The download view: every application box that did not come with the
+  // device, in the order the boxes were added, on virtual pages 100001 on.
+  // |parentId| is copied into the records; |isFolder| is not used.
+
+  std::vector<boost::shared_ptr<GameBoxData> > GetBoxDataListByDownload(int parentId,
+                                                                        bool isFolder);
+  // Also remembers each virtual page in m_pageMap.
+  std::vector<boost::shared_ptr<GamePageData> > GetPageDataListByDownload(int parentId,
+                                                                          bool isFolder);
+
   // ---- State.
 
   sqlite3* m_db;                      // null until _OpenDb
