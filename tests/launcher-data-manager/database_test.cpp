@@ -118,9 +118,13 @@ TEST_F(DatabaseTest, WriteLockHeldElsewhereFailsWritesAtOnce) {
   other.Exec("BEGIN EXCLUSIVE TRANSACTION");
 
   EXPECT_FALSE(store.BeginTransaction());
-  EXPECT_NE(SQLITE_OK, sqlite3_exec(store.m_db, "INSERT INTO menus(type) VALUES(0)", 0, 0, 0));
+  EXPECT_FALSE(store.DeleteMenuData(1));
+  GameViewData menu;
+  menu.name = "Apps";
+  store.InsertMenuData(menu);  // its step fails; an insert does not look at that
 
   other.Exec("COMMIT TRANSACTION");
+  EXPECT_EQ("0", other.Value("SELECT count(*) FROM Menus"));
   EXPECT_TRUE(store.BeginTransaction());
   EXPECT_TRUE(store.CommitTransaction());
 }

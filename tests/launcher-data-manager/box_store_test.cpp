@@ -1,0 +1,300 @@
+// Boxes: the three statement forms, reads by id and by application id.
+#include "launcher-data-manager/store-test.h"
+
+namespace {
+
+class BoxStoreTest : public StoreTest {
+ protected:
+  BoxStoreTest() : page(AddPage(1, 1)) {}
+
+  // A box with every stored member set to something recognisable.
+  GameBoxData Box(bool isFolder, int boxType) {
+    GameBoxData box;
+    box.isFolder = isFolder;
+    box.boxType = boxType;
+    box.pageId = page;
+    box.col = 2;
+    box.row = 3;
+    box.appId = "com.ex.racer";
+    box.name = "Racer";
+    box.iconPath = "/icons/racer.png";
+    box.content = "race://start";
+    box.isPreload = true;
+    box.isSystem = true;
+    box.launchType = 5;
+    return box;
+  }
+
+  Row Stored(int boxId) {
+    std::vector<Row> rows = db->Rows(
+        "SELECT isFolder, pageParentId, pageId, appId, name, col, row, isPreload, isSystem, "
+        "boxType, launchType, iconPath, content FROM Boxes WHERE boxId = " +
+        std::to_string(boxId));
+    return rows.empty() ? Row() : rows[0];
+  }
+
+  int page;
+};
+
+TEST_F(BoxStoreTest, InsertUsesTheFormOfTheBox) {
+  const std::string p = std::to_string(page);
+  struct Case {
+    const char* what;
+    bool isFolder;
+    int boxType;
+    Row stored;
+  } cases[] = {
+      {"folder: name and appId, no icon or content", true, 0,
+       {"1", "NULL", p, "com.ex.racer", "Racer", "2", "3", "1", "1", "0", "5", "NULL", "NULL"}},
+      {"shortcut: everything", false, 3,
+       {"0", "NULL", p, "com.ex.racer", "Racer", "2", "3", "1", "1", "3", "5",
+        "/icons/racer.png", "race://start"}},
+      {"application: only the id and the place", false, 0,
+       {"0", "NULL", p, "com.ex.racer", "NULL", "2", "3", "1", "1", "0", "5", "NULL", "NULL"}},
+      {"folder wins over type 3", true, 3,
+       {"1", "NULL", p, "com.ex.racer", "Racer", "2", "3", "1", "1", "3", "5", "NULL", "NULL"}},
+  };
+  for (const Case& c : cases) {
+    GameBoxData box = Box(c.isFolder, c.boxType);
+    int id = store.InsertBoxData(box);
+    EXPECT_GT(id, 0) << c.what;
+    EXPECT_EQ(id, box.boxId) << c.what;
+    EXPECT_EQ(c.stored, Stored(id)) << c.what;
+  }
+}
+
+TEST_F(BoxStoreTest, DefaultBoxIsStoredAsAnEmptyApplicationBox) {
+  GameBoxData box;
+  int id = store.InsertBoxData(box);
+  EXPECT_EQ((Row{"0", "NULL", "0", "NULL", "NULL", "0", "0", "0", "0", "0", "0", "NULL", "NULL"}),
+            Stored(id));
+}
+
+TEST_F(BoxStoreTest, EmptyTextsAreStoredAsNull) {
+  GameBoxData folder = Box(true, 0);
+  folder.name = "";
+  folder.appId = "";
+  int id = store.InsertBoxData(folder);
+  EXPECT_EQ("NULL|NULL", db->Value("SELECT quote(name) || '|' || quote(appId) FROM Boxes"));
+  EXPECT_EQ("", store.GetMenuBoxData(id)->name);
+}
+
+TEST_F(BoxStoreTest, UpdateOfAFolderStoresIsSystemZero) {
+  GameBoxData box = Box(true, 0);
+  int id = store.InsertBoxData(box);
+  box.name = "Puzzles";
+  box.col = 4;
+  EXPECT_TRUE(store.UpdateBoxData(box));
+  Row stored = Stored(id);
+  EXPECT_EQ("Puzzles", stored[4]);
+  EXPECT_EQ("4", stored[5]);
+  EXPECT_EQ("0", stored[8]);  // isSystem
+}
+
+TEST_F(BoxStoreTest, UpdateOfAnApplicationBoxKeepsIconAndContent) {
+  GameBoxData shortcut = Box(false, 3);
+  int id = store.InsertBoxData(shortcut);
+  GameBoxData box = Box(false, 0);
+  box.boxId = id;
+  box.name = "";
+  box.iconPath = "/elsewhere.png";
+  box.content = "changed";
+  EXPECT_TRUE(store.UpdateBoxData(box));
+  EXPECT_EQ((Row{"0", "NULL", std::to_string(page), "com.ex.racer", "NULL", "2", "3", "1", "1",
+                 "0", "5", "/icons/racer.png", "race://start"}),
+            Stored(id));
+}
+
+TEST_F(BoxStoreTest, UpdateOfAShortcutWritesEveryText) {
+  GameBoxData empty;
+  int id = store.InsertBoxData(empty);
+  int other = AddPage(1, 2);
+  GameBoxData box = Box(false, 3);
+  box.boxId = id;
+  box.pageId = other;
+  box.content = "";
+  EXPECT_TRUE(store.UpdateBoxData(box));
+  EXPECT_EQ((Row{"0", "NULL", std::to_string(other), "com.ex.racer", "Racer", "2", "3", "1", "1",
+                 "3", "5", "/icons/racer.png", "NULL"}),
+            Stored(id));
+}
+
+TEST_F(BoxStoreTest, UpdateTurnsABoxIntoAFolderAndBack) {
+  GameBoxData box = Box(false, 0);
+  int id = store.InsertBoxData(box);
+  box.isFolder = true;
+  store.UpdateBoxData(box);
+  EXPECT_EQ("1", Stored(id)[0]);
+  box.isFolder = false;
+  store.UpdateBoxData(box);
+  EXPECT_EQ("0", Stored(id)[0]);
+  EXPECT_EQ(id, box.boxId);
+}
+
+TEST_F(BoxStoreTest, UpdateOfAMissingBoxIsStillTrue) {
+  GameBoxData box = Box(false, 0);
+  box.boxId = 404;
+  EXPECT_TRUE(store.UpdateBoxData(box));
+  EXPECT_EQ("0", db->Value("SELECT count(*) FROM Boxes"));
+}
+
+TEST_F(BoxStoreTest, GetMenuBoxDataReadsEveryStoredMember) {
+  int folderPage = AddPage(17, 1, true);
+  GameBoxData box = Box(false, 3);
+  box.pageId = folderPage;
+  int id = store.InsertBoxData(box);
+
+  boost::shared_ptr<GameBoxData> read = store.GetMenuBoxData(id);
+  EXPECT_EQ(id, read->boxId);
+  EXPECT_FALSE(read->isFolder);
+  EXPECT_EQ(folderPage, read->pageId);
+  EXPECT_EQ(17, read->parentId);  // through the page
+  EXPECT_EQ(2, read->col);
+  EXPECT_EQ(3, read->row);
+  EXPECT_EQ("com.ex.racer", read->appId);
+  EXPECT_EQ("Racer", read->name);
+  EXPECT_TRUE(read->isPreload);
+  EXPECT_TRUE(read->isSystem);
+  EXPECT_EQ(3, read->boxType);
+  EXPECT_EQ(5, read->launchType);
+  EXPECT_EQ("/icons/racer.png", read->iconPath);
+  EXPECT_EQ("race://start", read->content);
+  EXPECT_EQ("", read->pkgId);  // never stored
+}
+
+TEST_F(BoxStoreTest, GetMenuBoxDataNeedsTheBoxAndItsPage) {
+  int id = AddBox(page, "a", 1, 1);
+  EXPECT_EQ(0, store.GetMenuBoxData(id + 1)->boxId);
+  db->Exec("DELETE FROM Pages");
+  boost::shared_ptr<GameBoxData> orphan = store.GetMenuBoxData(id);
+  ASSERT_TRUE(orphan);
+  EXPECT_EQ(0, orphan->boxId);
+  EXPECT_EQ("", orphan->appId);
+}
+
+TEST_F(BoxStoreTest, DeleteRemovesOneBoxAndLeavesAFoldersPages) {
+  GameBoxData folder = Box(true, 0);
+  int id = store.InsertBoxData(folder);
+  AddPage(id, 1, true);
+  EXPECT_TRUE(store.DeleteBoxData(id));
+  EXPECT_TRUE(store.DeleteBoxData(id));
+  EXPECT_EQ("0", db->Value("SELECT count(*) FROM Boxes"));
+  EXPECT_EQ("2", db->Value("SELECT count(*) FROM Pages"));
+}
+
+TEST_F(BoxStoreTest, CountTakesFoldersToo) {
+  AddBox(page, "a", 1, 1);
+  AddBoxSql("isFolder, pageId", "1, " + std::to_string(page));
+  AddBox(AddPage(1, 2), "b", 1, 1);
+  EXPECT_EQ(2, store.GetBoxDataCount(page));
+  EXPECT_EQ(0, store.GetBoxDataCount(page + 100));
+}
+
+// ---- Look-ups by application id
+
+TEST_F(BoxStoreTest, GetBoxIdByAppIdWritesOwnerPageAndBox) {
+  int folderPage = AddPage(31, 1, true);
+  int id = AddBox(folderPage, "com.ex.chess", 2, 1);
+  int parentId = -1, pageId = -1, boxId = -1;
+  EXPECT_TRUE(store.GetBoxIdByAppId("com.ex.chess", &parentId, &pageId, &boxId));
+  EXPECT_EQ(31, parentId);
+  EXPECT_EQ(folderPage, pageId);
+  EXPECT_EQ(id, boxId);
+}
+
+TEST_F(BoxStoreTest, LookUpsNeverFindAShortcut) {
+  GameBoxData shortcut = Box(false, 3);
+  shortcut.appId = "a";
+  store.InsertBoxData(shortcut);
+  int parentId = -1, pageId = -2, boxId = -3;
+  EXPECT_FALSE(store.GetBoxIdByAppId("a", &parentId, &pageId, &boxId));
+  EXPECT_EQ(-1, parentId);
+  EXPECT_EQ(-2, pageId);
+  EXPECT_EQ(-3, boxId);
+  EXPECT_EQ(0, store.GetBoxDataByAppId("a")->boxId);
+}
+
+TEST_F(BoxStoreTest, GetBoxDataByAppIdReadsPlacementAndFlagsOnly) {
+  GameBoxData box = Box(false, 0);
+  box.launchType = 9;
+  int id = store.InsertBoxData(box);
+  boost::shared_ptr<GameBoxData> read = store.GetBoxDataByAppId("com.ex.racer");
+  EXPECT_EQ(id, read->boxId);
+  EXPECT_EQ(page, read->pageId);
+  EXPECT_EQ(1, read->parentId);
+  EXPECT_EQ(2, read->col);
+  EXPECT_EQ(3, read->row);
+  EXPECT_EQ("com.ex.racer", read->appId);
+  EXPECT_TRUE(read->isPreload);
+  EXPECT_TRUE(read->isSystem);
+  EXPECT_EQ(0, read->launchType);  // not read by this look-up
+  EXPECT_TRUE(EngineLogs().empty());
+}
+
+TEST_F(BoxStoreTest, GetBoxDataByAppIdLogsAnUnknownId) {
+  AddBox(page, "", 1, 1);
+  boost::shared_ptr<GameBoxData> read = store.GetBoxDataByAppId("com.ex.none");
+  ASSERT_TRUE(read);
+  EXPECT_EQ(0, read->boxId);
+  EXPECT_EQ((std::vector<EngineLog>{{DLOG_ERROR, "launcher-data-manager.cpp", "GetBoxDataByAppId",
+                                     "cannot find box with appid[com.ex.none]"}}),
+            EngineLogs());
+}
+
+TEST_F(BoxStoreTest, EmptyAppIdIsLookedUpAsGiven) {
+  int id = AddBox(page, "", 1, 1);
+  AddBoxSql("isFolder, pageId", "0, " + std::to_string(page));  // NULL appId: never matches
+  int parentId = 0, pageId = 0, boxId = 0;
+  EXPECT_TRUE(store.GetBoxIdByAppId("", &parentId, &pageId, &boxId));
+  EXPECT_EQ(id, boxId);
+  EXPECT_EQ(id, store.GetBoxDataByAppId("")->boxId);
+}
+
+// ---- Failures
+
+TEST_F(BoxStoreTest, EveryOperationFailsAsTheLauncherExpectsWithoutItsTable) {
+  int id = AddBox(page, "a", 1, 1);
+  Break("Boxes");
+  GameBoxData box = Box(false, 0);
+  box.boxId = 88;
+
+  EXPECT_EQ(-1, store.InsertBoxData(box));
+  EXPECT_EQ(88, box.boxId);
+  EXPECT_TRUE(store.UpdateBoxData(box));
+  EXPECT_EQ(0, store.GetMenuBoxData(id)->boxId);
+  EXPECT_EQ(0, store.GetBoxDataCount(page));
+  int parentId = 7, pageId = 7, boxId = 7;
+  EXPECT_FALSE(store.GetBoxIdByAppId("a", &parentId, &pageId, &boxId));
+  EXPECT_EQ(7, boxId);
+  EXPECT_TRUE(EngineLogs().empty());
+  EXPECT_EQ("1", db->Value("SELECT count(*) FROM BoxesGone"));
+}
+
+TEST_F(BoxStoreTest, FailedDeleteLogsSqliteMessage) {
+  Break("Boxes");
+  EXPECT_FALSE(store.DeleteBoxData(1));
+  EXPECT_EQ((std::vector<EngineLog>{{DLOG_ERROR, "launcher-data-manager.cpp", "DeleteBoxData",
+                                     "sqlite error : no such table: boxes"}}),
+            EngineLogs());
+}
+
+TEST_F(BoxStoreTest, FailedLookUpLogsEachStepItTriesRegardless) {
+  Break("Boxes");
+  boost::shared_ptr<GameBoxData> read = store.GetBoxDataByAppId("com.ex.racer");
+  ASSERT_TRUE(read);
+  EXPECT_EQ(0, read->boxId);
+  const std::string sql =
+      "SELECT b.boxId, b.isFolder, p.pageId, col, row, appId, name, p.parentId, isPreload, "
+      "isSystem FROM boxes b, pages p ON b.pageId = p.pageId WHERE b.appId = $appId AND "
+      "b.boxType != 3 ";
+  EXPECT_EQ((std::vector<EngineLog>{
+                {DLOG_ERROR, "launcher-data-manager.cpp", "GetBoxDataByAppId",
+                 "sqlite error : [" + sql + ",no such table: boxes]"},
+                {DLOG_ERROR, "launcher-data-manager.cpp", "GetBoxDataByAppId",
+                 "Bind Err : com.ex.racer\n"},
+                {DLOG_ERROR, "launcher-data-manager.cpp", "GetBoxDataByAppId",
+                 "cannot find box with appid[com.ex.racer]"}}),
+            EngineLogs());
+}
+
+}  // namespace

@@ -1,0 +1,128 @@
+// Pages: single-page operations and counts.
+#include "launcher-data-manager/store-test.h"
+
+namespace {
+
+class PageStoreTest : public StoreTest {
+ protected:
+  static GamePageData Page(int parentId, int pageNo, bool isFolder) {
+    GamePageData page;
+    page.parentId = parentId;
+    page.pageNo = pageNo;
+    page.isFolder = isFolder;
+    return page;
+  }
+};
+
+TEST_F(PageStoreTest, InsertWritesTheFlagAsOneAndReturnsTheId) {
+  GamePageData menuPage = Page(1, 1, false);
+  GamePageData folderPage = Page(12, 3, true);
+  EXPECT_EQ(1, store.InsertPageData(menuPage));
+  EXPECT_EQ(2, store.InsertPageData(folderPage));
+  EXPECT_EQ(2, folderPage.pageId);
+  EXPECT_EQ((std::vector<Row>{{"1", "0", "1", "1"}, {"2", "1", "12", "3"}}),
+            db->Rows("SELECT pageId, isFolder, parentId, pageNo FROM Pages"));
+}
+
+TEST_F(PageStoreTest, UpdateMovesThePageButNeverChangesItsKind) {
+  int id = AddPage(1, 1, true);
+  GamePageData page = Page(7, 4, false);
+  page.pageId = id;
+  EXPECT_TRUE(store.UpdatePageData(page));
+  EXPECT_EQ((std::vector<Row>{{"1", "7", "4"}}),
+            db->Rows("SELECT isFolder, parentId, pageNo FROM Pages"));
+}
+
+TEST_F(PageStoreTest, GetMenuPageDataReadsOneOrGivesTheDefault) {
+  int id = AddPage(12, 2, true);
+  boost::shared_ptr<GamePageData> page = store.GetMenuPageData(id);
+  EXPECT_EQ(id, page->pageId);
+  EXPECT_TRUE(page->isFolder);
+  EXPECT_EQ(12, page->parentId);
+  EXPECT_EQ(2, page->pageNo);
+
+  boost::shared_ptr<GamePageData> missing = store.GetMenuPageData(id + 1);
+  ASSERT_TRUE(missing);
+  EXPECT_EQ(0, missing->pageId);
+  EXPECT_FALSE(missing->isFolder);
+  EXPECT_EQ(0, missing->parentId);
+  EXPECT_EQ(0, missing->pageNo);
+}
+
+TEST_F(PageStoreTest, DeletionsLeaveTheBoxesBehind) {
+  int first = AddPage(1, 1);
+  AddPage(1, 2);
+  AddBox(first, "a", 1, 1);
+  EXPECT_TRUE(store.DeletePageData(first));
+  EXPECT_TRUE(store.DeletePageData(first));
+  EXPECT_EQ("2", db->Value("SELECT group_concat(pageNo) FROM Pages"));
+  EXPECT_EQ("1", db->Value("SELECT count(*) FROM Boxes"));
+}
+
+TEST_F(PageStoreTest, DeleteFolderPagesTakesEveryPageOfThatParentId) {
+  AddPage(5, 1, true);
+  AddPage(5, 2, true);
+  AddPage(5, 1, false);  // menu 5 shares the number, and goes too
+  AddPage(6, 1, true);
+  EXPECT_TRUE(store.DeleteFolderPageData(5));
+  EXPECT_EQ((std::vector<Row>{{"6"}}), db->Rows("SELECT parentId FROM Pages"));
+}
+
+TEST_F(PageStoreTest, PageCountAlwaysAnswersZero) {
+  AddPage(1, 1);
+  AddPage(1, 2);
+  EXPECT_EQ(0, store.GetPageDataCount(1, false));
+  EXPECT_EQ(0, store.GetPageDataCount(1, true));
+  EXPECT_TRUE(EngineLogs().empty());
+}
+
+TEST_F(PageStoreTest, DownloadCountTakesUnpreloadedAppBoxesOnExistingPages) {
+  int page = AddPage(1, 1);
+  int folderPage = AddPage(40, 1, true);
+  AddBox(page, "a", 1, 1);
+  AddBox(folderPage, "b", 1, 1);
+  AddBoxSql("isFolder, pageId, appId, isPreload, boxType",
+            "0, " + std::to_string(page) + ", 'shortcut', 0, 3");
+  AddBoxSql("isFolder, pageId, isPreload, boxType", "1, " + std::to_string(page) + ", 0, 0");
+  AddBoxSql("isFolder, pageId, appId, isPreload, boxType",
+            "0, " + std::to_string(page) + ", 'pre', 1, 0");
+  AddBox(999, "orphan", 1, 1);  // its page does not exist
+
+  // a, b and the shortcut count; the folder, the preloaded box and the orphan do not.
+  EXPECT_EQ(3, store._GetPageDataCountByDownload(1));
+  EXPECT_EQ(3, store._GetPageDataCountByDownload(-8));
+}
+
+TEST_F(PageStoreTest, AlphabeticalFormsAnswerFixedValuesAndTouchNothing) {
+  int id = AddPage(1, 1);
+  GamePageData page = Page(9, 9, true);
+  page.pageId = id;
+  EXPECT_EQ(-1, store.InsertPageDataForAlphaBeticalOrder(page));
+  EXPECT_FALSE(store.UpdatePageDataForAlphaBeticalOrder(page));
+  EXPECT_FALSE(store.DeletePageDataForAlphaBeticalOrder(id));
+  EXPECT_EQ(id, page.pageId);
+  EXPECT_EQ((std::vector<Row>{{"0", "1", "1"}}),
+            db->Rows("SELECT isFolder, parentId, pageNo FROM Pages"));
+}
+
+// ---- Failures
+
+TEST_F(PageStoreTest, EveryOperationFailsQuietlyWithoutItsTable) {
+  AddPage(1, 1);
+  Break("Pages");
+  GamePageData page = Page(1, 2, false);
+  page.pageId = 77;
+
+  EXPECT_EQ(-1, store.InsertPageData(page));
+  EXPECT_EQ(77, page.pageId);
+  EXPECT_FALSE(store.UpdatePageData(page));
+  EXPECT_FALSE(store.DeletePageData(1));
+  EXPECT_FALSE(store.DeleteFolderPageData(1));
+  EXPECT_EQ(0, store.GetMenuPageData(1)->pageId);
+  EXPECT_EQ(0, store._GetPageDataCountByDownload(1));
+
+  EXPECT_TRUE(EngineLogs().empty());
+  EXPECT_EQ("1", db->Value("SELECT count(*) FROM PagesGone"));
+}
+
+}  // namespace

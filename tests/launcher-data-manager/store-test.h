@@ -1,0 +1,41 @@
+// StoreTest: an open store on a fresh simulated device, plus plain SQL to lay
+// out rows directly, read back what the store wrote, and break the file.
+#ifndef KORRIN_TESTS_LAUNCHER_DATA_MANAGER_STORE_TEST_H_
+#define KORRIN_TESTS_LAUNCHER_DATA_MANAGER_STORE_TEST_H_
+
+#include <dlog.h>
+
+#include <memory>
+#include <string>
+#include <vector>
+
+#include "launcher-data-manager/launcher-data-manager.h"
+#include "support/sim-test.h"
+#include "support/sql-probe.h"
+
+class StoreTest : public SimTest {
+ protected:
+  StoreTest();
+
+  // Direct rows, bypassing the store. Each returns the new row id.
+  int AddMenu(const std::string& name);
+  int AddPage(int parentId, int pageNo, bool isFolder = false);
+  int AddBox(int pageId, const std::string& appId, int col, int row);
+  int AddBoxSql(const std::string& columns, const std::string& values);
+
+  // Renames |table| away, so that every statement naming it stops compiling.
+  void Break(const std::string& table);
+
+  // The SQL texts the store's connection has run since the last call.
+  std::vector<std::string> TakeStatements();
+
+  // (col,row) pairs of |boxes|, for compact layout checks.
+  static std::vector<std::pair<int, int> > Cells(
+      const std::vector<boost::shared_ptr<GameBoxData> >& boxes);
+
+  LauncherDataManager store;
+  std::unique_ptr<SqlProbe> db;
+  std::vector<std::string> statements;
+};
+
+#endif  // KORRIN_TESTS_LAUNCHER_DATA_MANAGER_STORE_TEST_H_
