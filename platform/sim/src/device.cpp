@@ -1,4 +1,6 @@
-// The control interface of the simulated device.
+// The simulated device as a whole: its one state, Reset, the device root and
+// the records (platform log, usage logs). Each platform area keeps its own
+// part of the control interface beside its C calls.
 #include "sim/device.h"
 
 #include <errno.h>
@@ -48,8 +50,10 @@ Device& Device::Get() {
 void Device::Reset() {
   State& state = TheState();
   bool echo = state.echoLogs;
+  Held held = std::move(state.held);
   state = State();
   state.echoLogs = echo;
+  state.held = std::move(held);
 }
 
 bool Device::UseRoot(const std::string& dir) {
@@ -69,5 +73,13 @@ const std::vector<LogLine>& Device::Logs() const { return TheState().logs; }
 void Device::ClearLogs() { TheState().logs.clear(); }
 
 void Device::EchoLogs(bool on) { TheState().echoLogs = on; }
+
+const std::vector<UsageLog>& Device::UsageLogs() const { return TheState().usageLogs; }
+
+char* CopyText(const std::string& text) { return strdup(text.c_str()); }
+
+char* CopyText(const std::optional<std::string>& text) {
+  return text ? CopyText(*text) : NULL;
+}
 
 }  // namespace sim
