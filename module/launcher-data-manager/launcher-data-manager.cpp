@@ -3,6 +3,7 @@
 // spliced in decimal (bools as 0 or 1), text bound through named parameters.
 #include "launcher-data-manager/launcher-data-manager.h"
 
+#include <limits.h>
 #include <math.h>
 
 #include <sstream>
@@ -30,6 +31,13 @@ const int kShortcutBoxType = 3;
 // The computed views number their pages from here; stored pages never get near.
 const int kVirtualPageBase = 100000;
 
+// New applications always go to this menu.
+const int kFirstMenuId = 1;
+
+// The alphabetical view and its packing lay folders out 3 by 3.
+const int kFolderColumns = 3;
+const int kFolderRows = 3;
+
 // The whole schema, run in one sqlite3_exec.
 const char kSchema[] =
     "PRAGMA journal_mode = PERSIST;"
@@ -56,6 +64,122 @@ void BindBoxTexts(Statement& stmt, const GameBoxData& box) {
   stmt.BindTextIfNotEmpty("$appId", box.appId);
   stmt.BindTextIfNotEmpty("$iconPath", box.iconPath);
   stmt.BindTextIfNotEmpty("$content", box.content);
+}
+
+// The id of the k-th virtual page of a parent in the alphabetical view. A
+// folder's pages carry its boxId in the high part; like the device, the
+// product wraps for very large box ids rather than failing.
+int AlphabeticalPageId(int parentId, bool isFolder, int k) {
+  unsigned base = isFolder ? static_cast<unsigned>(parentId) * kVirtualPageBase : kVirtualPageBase;
+  return static_cast<int>(base + static_cast<unsigned>(k));
+}
+
+// A cell on a stored page.
+struct Cell {
+  int pageId;
+  int col;
+  int row;
+};
+
+int InsertPage(LauncherDataManager& store, int parentId, bool isFolder, int pageNo) {
+  GamePageData page;
+  page.isFolder = isFolder;
+  page.parentId = parentId;
+  page.pageNo = pageNo;
+  return store.InsertPageData(page);
+}
+
+// Where a new box of the parent goes: after the last box of its last page,
+// wrapping after |columns|; on a new page, numbered after the last, when the
+// row would pass |rowBound| or when that last box stood in row 0; on a first
+// page when the parent has none. Sets |*pageAdded| when it made a page.
+// Returns false when the last page is unreadable. A new box never fills a hole.
+bool FindCellAfterLastBox(LauncherDataManager& store, int parentId, bool isFolder, int columns,
+                          int rowBound, Cell* cell, bool* pageAdded) {
+  std::vector<PagePtr> pages = store.GetPageDataList(parentId, isFolder);
+  if (pages.empty()) {
+    cell->pageId = InsertPage(store, parentId, isFolder, 1);
+    cell->col = 1;
+    cell->row = 1;
+    *pageAdded = true;
+    return true;
+  }
+  PagePtr last = pages.back();
+  if (!last) return false;
+
+  std::vector<BoxPtr> boxes = store.GetBoxDataList(last->pageId);
+  int lastCol = 0;  // an empty page takes the box in its first cell
+  int lastRow = 1;
+  if (!boxes.empty() && boxes.back()) {
+    lastCol = boxes.back()->col;
+    lastRow = boxes.back()->row;
+  }
+  cell->pageId = last->pageId;
+  if (lastCol < columns) {
+    cell->col = lastCol + 1;
+    cell->row = lastRow;
+    return true;
+  }
+  cell->col = 1;
+  // A last box in row 0 starts a new page rather than being followed in row 1;
+  // kept as the launcher expects it.
+  if (lastRow >= rowBound || lastRow == 0) {
+    cell->pageId = InsertPage(store, parentId, isFolder, last->pageNo + 1);
+    cell->row = 1;
+    *pageAdded = true;
+  } else {
+    cell->row = lastRow + 1;
+  }
+  return true;
+}
+
+// Stores a new application box, of type 0 with only its id and place.
+int InsertAppBox(LauncherDataManager& store, const std::string& appId, const Cell& cell) {
+  GameBoxData box;
+  box.pageId = cell.pageId;
+  box.col = cell.col;
+  box.row = cell.row;
+  box.appId = appId;
+  return store.InsertBoxData(box);
+}
+
+// Writes |boxes| row by row from the first cell, |columns| to a row, until the
+// row would pass |rows|; the boxes after that keep their cells. Folder boxes
+// are skipped, keeping their cells, when |skipFolders| is set. Returns how many
+// boxes were placed.
+int PackBoxes(LauncherDataManager& store, const std::vector<BoxPtr>& boxes, int columns, int rows,
+              bool skipFolders) {
+  int col = 1;
+  int row = 1;
+  int placed = 0;
+  for (size_t i = 0; i < boxes.size(); ++i) {
+    const BoxPtr& box = boxes[i];
+    if (!box || (skipFolders && box->isFolder)) continue;
+    box->col = col;
+    box->row = row;
+    store.UpdateBoxData(*box);
+    ++placed;
+    if (++col > columns) {
+      if (++row > rows) break;
+      col = 1;
+    }
+  }
+  return placed;
+}
+
+// Packs each page of a folder from its first cell on the menu's width, with no
+// row bound; a nested folder keeps its cell and takes none. An empty page goes
+// unless it is the folder's only one. The pages are not renumbered.
+void PackFolderPages(LauncherDataManager& store, int folderBoxId) {
+  std::vector<PagePtr> pages = store.GetPageDataList(folderBoxId, true);
+  for (size_t i = 0; i < pages.size(); ++i) {
+    std::vector<BoxPtr> boxes = store.GetBoxDataList(pages[i]->pageId);
+    if (pages.size() > 1 && boxes.empty()) {
+      store.DeletePageData(pages[i]->pageId);
+    } else {
+      PackBoxes(store, boxes, store.m_columns, INT_MAX, true);
+    }
+  }
 }
 
 }  // namespace
@@ -524,4 +648,342 @@ std::vector<PagePtr> LauncherDataManager::GetPageDataListByDownload(int parentId
     m_pageMap[page->pageId] = parentId;
   }
   return pages;
+}
+
+// ---------------------------------------------------------------------------
+// Placement and packing
+
+int LauncherDataManager::InsertBoxData(std::string appId, bool& pageAdded) {
+  Cell cell;
+  if (!FindCellAfterLastBox(*this, kFirstMenuId, false, m_columns, m_maxRows, &cell, &pageAdded)) {
+    return -1;
+  }
+  return InsertAppBox(*this, appId, cell);
+}
+
+int LauncherDataManager::InsertBoxDataForDeactivatedApp(int menuId, std::string appId) {
+  Cell cell;
+  bool pageAdded = false;  // not reported to this caller
+  // Two rows more than a placement in menu 1 allows; kept as the launcher expects it.
+  if (!FindCellAfterLastBox(*this, menuId, false, m_columns, m_maxRows + 2, &cell, &pageAdded)) {
+    return 0;
+  }
+  return InsertAppBox(*this, appId, cell);
+}
+
+int LauncherDataManager::DeleteBoxDataForDeactivatedApp(int menuId, int boxId) {
+  DeleteBoxData(boxId);
+  _ReorderDataWithoutSpace(menuId, false);
+  return 1;
+}
+
+void LauncherDataManager::_ReorderData(int parentId, bool isFolder) {
+  int columns = isFolder ? kFolderColumns : m_columns;
+  int rows = isFolder ? kFolderRows : m_maxRows;
+  std::vector<PagePtr> pages = GetPageDataList(parentId, isFolder);
+  if (pages.empty()) return;
+
+  int placed = 0;
+  for (size_t i = 0; i < pages.size(); ++i) {
+    if (pages[i]) placed += PackBoxes(*this, GetBoxDataList(pages[i]->pageId), columns, rows, false);
+  }
+
+  // With nothing placed at all, empty pages are kept and only renumbered.
+  int pageNo = 1;
+  for (size_t i = 0; i < pages.size(); ++i) {
+    if (!pages[i]) continue;
+    if (placed != 0 && GetBoxDataList(pages[i]->pageId).empty()) {
+      DeletePageData(pages[i]->pageId);
+    } else {
+      pages[i]->pageNo = pageNo++;
+      UpdatePageData(*pages[i]);
+    }
+  }
+}
+
+void LauncherDataManager::_ReorderDataWithoutSpace(int parentId, bool isFolder) {
+  std::vector<PagePtr> pages = GetPageDataList(parentId, isFolder);
+  if (pages.empty()) return;
+
+  std::vector<BoxPtr> queue;
+  for (size_t i = 0; i < pages.size(); ++i) {
+    if (!pages[i]) continue;
+    std::vector<BoxPtr> boxes = GetBoxDataList(pages[i]->pageId);
+    queue.insert(queue.end(), boxes.begin(), boxes.end());
+  }
+
+  // The menu grid whatever isFolder says, and a row bound of m_maxRows + 2;
+  // both kept as the launcher expects them.
+  size_t next = 0;
+  for (size_t i = 0; i < pages.size() && next < queue.size(); ++i) {
+    if (!pages[i]) continue;
+    int col = 1;
+    int row = 1;
+    while (next < queue.size()) {
+      GameBoxData& box = *queue[next++];
+      box.col = col;
+      box.row = row;
+      box.pageId = pages[i]->pageId;
+      UpdateBoxData(box);
+      if (++col > m_columns) {
+        if (++row > m_maxRows + 2) break;
+        col = 1;
+      }
+    }
+  }
+
+  int pageNo = 1;
+  for (size_t i = 0; i < pages.size(); ++i) {
+    if (!pages[i]) continue;
+    if (GetBoxDataList(pages[i]->pageId).empty()) {
+      DeletePageData(pages[i]->pageId);
+    } else {
+      pages[i]->pageNo = pageNo++;
+      UpdatePageData(*pages[i]);
+    }
+  }
+}
+
+void LauncherDataManager::RearrangeAppsPosition() {
+  BeginTransaction();
+  std::vector<MenuPtr> menus = GetMenuDataList();
+  for (size_t m = 0; m < menus.size(); ++m) {
+    if (!menus[m]) continue;
+    std::vector<PagePtr> pages = GetPageDataList(menus[m]->menuId, false);
+    int pageNo = 1;
+    for (size_t p = 0; p < pages.size(); ++p) {
+      std::vector<BoxPtr> boxes = GetBoxDataList(pages[p]->pageId);
+      // A menu's only page stays, empty or not.
+      if (pages.size() > 1 && boxes.empty()) {
+        DeletePageData(pages[p]->pageId);
+        continue;
+      }
+      pages[p]->pageNo = pageNo++;
+      UpdatePageData(*pages[p]);
+
+      // No row bound here: a menu page grows downward.
+      PackBoxes(*this, boxes, m_columns, INT_MAX, false);
+      for (size_t b = 0; b < boxes.size(); ++b) {
+        if (boxes[b] && boxes[b]->isFolder) PackFolderPages(*this, boxes[b]->boxId);
+      }
+    }
+  }
+  CommitTransaction();
+}
+
+// ---------------------------------------------------------------------------
+// The alphabetical view
+
+namespace {
+
+// The boxes of one parent by name; ties keep SQLite's order.
+std::string AlphabeticalBoxesSql(int parentId, bool isFolder) {
+  std::stringstream sql;
+  sql << "SELECT boxId, b.isFolder, appId, name, isPreload, isSystem, boxType, launchType, "
+         "iconPath, content "
+      << "FROM boxes b, pages p ON p.pageId = b.pageId "
+      << "WHERE p.isFolder = " << isFolder << " AND p.parentId = " << parentId << " "
+      << "ORDER BY name COLLATE NOCASE";
+  return sql.str();
+}
+
+BoxPtr ReadAlphabeticalBox(const Statement& stmt) {
+  BoxPtr box(new GameBoxData);
+  box->boxId = stmt.Int(0);
+  box->isFolder = stmt.Bool(1);
+  box->appId = stmt.Text(2);
+  box->name = stmt.Text(3);
+  box->isPreload = stmt.Bool(4);
+  box->isSystem = stmt.Bool(5);
+  box->boxType = stmt.Int(6);
+  box->launchType = stmt.Int(7);
+  box->iconPath = stmt.Text(8);
+  box->content = stmt.Text(9);
+  return box;
+}
+
+// Walks the cells of the view: |columns| to a row, |rows| to a page.
+class GridCursor {
+ public:
+  GridCursor(int columns, int rows) : page(0), col(1), row(1), m_columns(columns), m_rows(rows) {}
+
+  void Advance() {
+    if (++col <= m_columns) return;
+    col = 1;
+    if (++row <= m_rows) return;
+    row = 1;
+    ++page;
+  }
+
+  int page;  // counted from 0
+  int col;
+  int row;
+
+ private:
+  int m_columns;
+  int m_rows;
+};
+
+}  // namespace
+
+std::vector<BoxPtr> LauncherDataManager::GetBoxDataListByAlphabeticalOrder(int parentId,
+                                                                           bool isFolder) {
+  std::vector<BoxPtr> boxes;
+  GridCursor cursor(isFolder ? kFolderColumns : m_columns, isFolder ? kFolderRows : m_maxRows);
+  Statement stmt(m_db, AlphabeticalBoxesSql(parentId, isFolder), kPrepareLegacy);
+  while (stmt.Step()) {
+    BoxPtr box = ReadAlphabeticalBox(stmt);
+    box->pageId = AlphabeticalPageId(parentId, isFolder, cursor.page + 1);
+    box->col = cursor.col;
+    box->row = cursor.row;
+    boxes.push_back(box);
+    cursor.Advance();
+  }
+  return boxes;
+}
+
+std::vector<BoxPtr> LauncherDataManager::GetBoxDataListByAlphabeticalOrderWithRealPage(
+    int parentId, bool isFolder) {
+  // The stored pages of every parent with this id, menu or folder alike: the
+  // launcher's statement does not look at isFolder.
+  std::vector<int> pageIds;
+  std::stringstream pagesSql;
+  pagesSql << "SELECT pageId from Pages "
+           << "WHERE parentId = " << parentId << " "
+           << "Order By pageNo ASC ";
+  Statement pages(m_db, pagesSql.str(), kPrepareLegacy);
+  while (pages.Step()) pageIds.push_back(pages.Int(0));
+
+  std::vector<BoxPtr> boxes;
+  GridCursor cursor(isFolder ? kFolderColumns : m_columns, isFolder ? kFolderRows : m_maxRows);
+  Statement stmt(m_db, AlphabeticalBoxesSql(parentId, isFolder), kPrepareLegacy);
+  // The listing ends where the view would need a page the parent does not have.
+  while (static_cast<size_t>(cursor.page) < pageIds.size() && stmt.Step()) {
+    BoxPtr box = ReadAlphabeticalBox(stmt);
+    box->pageId = pageIds[cursor.page];
+    box->col = cursor.col;
+    box->row = cursor.row;
+    boxes.push_back(box);
+    cursor.Advance();
+  }
+  return boxes;
+}
+
+std::vector<PagePtr> LauncherDataManager::GetPageDataListByAlphabeticalOrder(int parentId,
+                                                                            bool isFolder) {
+  std::stringstream sql;
+  sql << "SELECT COUNT(*) "
+      << "FROM boxes b, pages p ON p.pageId = b.pageId "
+      << "WHERE p.isFolder = " << isFolder << " AND p.parentId = " << parentId;
+  Statement count(m_db, sql.str(), kPrepareLegacy);
+  int boxCount = count.Step() ? count.Int(0) : 0;
+
+  // An empty menu still shows one page; an empty folder shows none.
+  int pageCount;
+  if (isFolder) {
+    pageCount = static_cast<int>(ceil(boxCount / 9.0));
+  } else {
+    pageCount = static_cast<int>(ceil(static_cast<double>(boxCount) / (m_maxRows * m_columns)));
+    if (pageCount == 0) pageCount = 1;
+  }
+
+  std::vector<PagePtr> pages;
+  for (int k = 1; k <= pageCount; ++k) {
+    PagePtr page(new GamePageData);
+    page->pageId = AlphabeticalPageId(parentId, isFolder, k);
+    page->isFolder = isFolder;
+    page->parentId = parentId;
+    page->pageNo = k;
+    pages.push_back(page);
+    m_pageMap[page->pageId] = parentId;
+    m_pageFlagMap[page->pageId] = isFolder;
+  }
+  return pages;
+}
+
+int LauncherDataManager::InsertBoxDataForAlphaBeticalOrder(GameBoxData& box) {
+  Cell cell;
+  bool pageAdded = false;  // not reported to this caller
+  if (!FindCellAfterLastBox(*this, kFirstMenuId, false, m_columns, m_maxRows, &cell, &pageAdded)) {
+    return -1;
+  }
+  box.pageId = cell.pageId;
+  box.col = cell.col;
+  box.row = cell.row;
+  return InsertBoxData(box);
+}
+
+int LauncherDataManager::UpdateBoxDataForAlphaBeticalOrder(GameBoxData& box) {
+  BoxPtr stored = GetMenuBoxData(box.boxId);
+  if (stored->boxId == 0) {
+    KLOG(DLOG_ERROR, "No box [%d]", box.boxId);
+    return 0;
+  }
+  PagePtr oldPage = GetMenuPageData(stored->pageId);
+  if (oldPage->pageId == 0) {
+    KLOG(DLOG_ERROR, "No page [%d]", stored->pageId);
+    return 0;
+  }
+  if (oldPage->parentId == 0) {
+    KLOG(DLOG_ERROR, "invalid page parent id");
+    return 0;
+  }
+
+  // Where the box was dropped: a virtual page handed out by the page listing,
+  // else a stored page, else the parent the caller names. A miss leaves an
+  // empty entry in both maps, as the launcher has always done.
+  int targetParent = m_pageMap[box.pageId];
+  bool targetIsFolder = m_pageFlagMap[box.pageId];
+  if (targetParent == 0) {
+    PagePtr dropped = GetMenuPageData(box.pageId);
+    if (dropped->pageId != 0) {
+      targetParent = dropped->parentId;
+    } else {
+      KLOG(DLOG_ERROR, "No page [%d]", box.pageId);
+      targetParent = box.parentId;
+      // Menus have small ids; a parent above 5 is taken for a folder box.
+      targetIsFolder = box.parentId > 5;
+    }
+  }
+
+  if (targetParent == oldPage->parentId) {
+    std::stringstream sql;
+    sql << "UPDATE boxes set "
+        << "name = $name "
+        << " WHERE boxId = " << box.boxId;
+    Statement rename(m_db, sql.str(), kPrepareV2);
+    rename.BindTextIfNotEmpty("$name", box.name);
+    rename.Step();
+    return 0;
+  }
+
+  Cell cell;
+  bool pageAdded = false;  // not reported to this caller
+  if (!FindCellAfterLastBox(*this, box.parentId, targetIsFolder,
+                            targetIsFolder ? kFolderColumns : m_columns,
+                            targetIsFolder ? kFolderRows : m_maxRows, &cell, &pageAdded)) {
+    return 0;
+  }
+  box.pageId = cell.pageId;
+  box.col = cell.col;
+  box.row = cell.row;
+  bool updated = UpdateBoxData(box);
+  if (updated) _ReorderData(oldPage->parentId, oldPage->isFolder);
+  return updated;
+}
+
+int LauncherDataManager::DeleteBoxDataForAlphaBeticalOrder(int boxId) {
+  BoxPtr box = GetMenuBoxData(boxId);
+  if (box->boxId == 0) {
+    KLOG(DLOG_ERROR, "No box [%d]", boxId);
+    return 0;
+  }
+  PagePtr page = GetMenuPageData(box->pageId);
+  if (page->pageId == 0) {
+    KLOG(DLOG_ERROR, "No page [%d]", box->pageId);
+    return 0;
+  }
+  DeleteBoxData(boxId);
+  _ReorderData(page->parentId, page->isFolder);
+  return 0;
 }

@@ -123,6 +123,59 @@ class LauncherDataManager {
   std::vector<boost::shared_ptr<GamePageData> > GetPageDataListByDownload(int parentId,
                                                                           bool isFolder);
 
+  // ---- Placement and packing. These work only through the record operations
+  // and listings above; none opens a transaction except RearrangeAppsPosition.
+
+  // Places a new application box after the last box of the last page of menu
+  // 1 (a new page when the row would pass m_maxRows, or when that box stood in
+  // row 0). Never fills a hole. Sets |pageAdded| when it made a page and never
+  // clears it. Returns the new boxId, or -1 when the last page is unreadable.
+  int InsertBoxData(std::string appId, bool& pageAdded);
+  // As above in |menuId|, wrapping only after row m_maxRows + 2. Returns the
+  // new boxId, or 0 when the last page is unreadable.
+  int InsertBoxDataForDeactivatedApp(int menuId, std::string appId);
+  // Deletes the box and packs the menu without gaps. Always 1.
+  int DeleteBoxDataForDeactivatedApp(int menuId, int boxId);
+  // Packs each page of the parent from its first cell (3 by 3 for a folder;
+  // boxes past the last row keep their cells), then renumbers the pages and
+  // deletes the empty ones, unless no box was placed at all.
+  void _ReorderData(int parentId, bool isFolder);
+  // Pours every box of the parent into its pages from the first cell on, on
+  // the menu grid with row bound m_maxRows + 2; renumbers the pages that hold
+  // boxes and deletes the others. Boxes left when pages run out stay put.
+  void _ReorderDataWithoutSpace(int parentId, bool isFolder);
+  // In one transaction, for every menu: renumbers its pages, deletes empty ones
+  // (never a menu's only page) and packs each page and each folder's pages.
+  void RearrangeAppsPosition();
+
+  // ---- The alphabetical view: the boxes of one parent by name (NOCASE), on
+  // computed cells (3 by 3 for a folder). Menu pages are virtual pages 100001
+  // on; folder pages are parentId * 100000 + k.
+
+  // The boxes, each on its virtual page.
+  std::vector<boost::shared_ptr<GameBoxData> > GetBoxDataListByAlphabeticalOrder(int parentId,
+                                                                                 bool isFolder);
+  // The same cells, each on the parent's stored page of that rank. The listing
+  // ends at the last stored page: boxes that would need more pages than the
+  // parent has are left out.
+  std::vector<boost::shared_ptr<GameBoxData> > GetBoxDataListByAlphabeticalOrderWithRealPage(
+      int parentId, bool isFolder);
+  // The virtual pages (a menu has at least one, an empty folder none); each is
+  // remembered in m_pageMap and m_pageFlagMap for the edits below.
+  std::vector<boost::shared_ptr<GamePageData> > GetPageDataListByAlphabeticalOrder(int parentId,
+                                                                                  bool isFolder);
+  // Stores a caller-filled box after the last box of menu 1; only its pageId,
+  // col and row are set here. Returns the new boxId, or -1.
+  int InsertBoxDataForAlphaBeticalOrder(GameBoxData& box);
+  // |box| names a stored boxId, its new name, the page it was dropped on
+  // (virtual or stored) and, in parentId, its new parent. Dropped within its
+  // own parent, only the name changes (0). Otherwise the box goes after the
+  // new parent's last box, the old parent is packed, and the result is
+  // UpdateBoxData's. 0, logged, when the box or its page is unknown.
+  int UpdateBoxDataForAlphaBeticalOrder(GameBoxData& box);
+  // Deletes the box and packs its old parent. Always 0; an unknown box is logged.
+  int DeleteBoxDataForAlphaBeticalOrder(int boxId);
+
   // ---- State.
 
   sqlite3* m_db;                      // null until _OpenDb
