@@ -40,6 +40,17 @@ int StoreTest::AddBoxSql(const std::string& columns, const std::string& values) 
   return static_cast<int>(sqlite3_last_insert_rowid(db->db()));
 }
 
+void StoreTest::FillPage(int pageId, int count, const std::string& prefix) {
+  db->Exec("INSERT INTO Boxes(isFolder, pageId, appId, col, row, isPreload, isSystem, boxType, "
+           "launchType) WITH RECURSIVE n(i) AS (SELECT 0 UNION ALL SELECT i + 1 FROM n WHERE i < " +
+           std::to_string(count - 1) + ") SELECT 0, " + std::to_string(pageId) + ", '" + prefix +
+           "' || i, i % 4 + 1, i / 4 + 1, 0, 0, 0, 0 FROM n");
+}
+
+std::string StoreTest::CellOf(const std::string& appId) {
+  return db->Value("SELECT col || ',' || row FROM Boxes WHERE appId = '" + appId + "'");
+}
+
 void StoreTest::Break(const std::string& table) {
   db->Exec("ALTER TABLE " + table + " RENAME TO " + table + "Gone");
   // The store's connection notices the change at its next read of the schema;

@@ -1,0 +1,143 @@
+// Where a new application's box goes.
+#include "launcher-data-manager/store-test.h"
+
+namespace {
+
+class PlacementTest : public StoreTest {
+ protected:
+  PlacementTest() : apps(AddMenu("Apps")) {}
+
+  // "pageNo:col,row" of the box of |appId|.
+  std::string PlaceOf(const std::string& appId) {
+    return db->Value("SELECT p.pageNo || ':' || b.col || ',' || b.row FROM Boxes b, Pages p "
+                     "ON p.pageId = b.pageId WHERE b.appId = '" + appId + "'");
+  }
+
+  int apps;
+};
+
+TEST_F(PlacementTest, FirstAppOfAnEmptyMenuOpensPageOne) {
+  bool pageAdded = false;
+  int id = store.InsertBoxData("com.ex.racer", pageAdded);
+  EXPECT_TRUE(pageAdded);
+  EXPECT_EQ((std::vector<Row>{{"0", "1", "1"}}),
+            db->Rows("SELECT isFolder, parentId, pageNo FROM Pages"));
+  EXPECT_EQ((std::vector<Row>{{std::to_string(id), "0", "com.ex.racer", "NULL", "1", "1", "0",
+                               "0", "0", "0", "NULL", "NULL"}}),
+            db->Rows("SELECT boxId, isFolder, appId, name, col, row, isPreload, isSystem, "
+                     "boxType, launchType, iconPath, content FROM Boxes"));
+}
+
+TEST_F(PlacementTest, NextAppFollowsTheLastBoxAndWrapsAtFourColumns) {
+  int page = AddPage(apps, 1);
+  AddBox(page, "a", 1, 1);
+  AddBox(page, "b", 3, 7);
+  AddBox(page, "c", 4, 7);
+  struct Case {
+    bool pageAddedBefore;
+    std::string appId;
+    std::string place;
+  } cases[] = {{false, "d", "1:1,8"}, {true, "e", "1:2,8"}};
+  for (const Case& c : cases) {
+    bool pageAdded = c.pageAddedBefore;
+    store.InsertBoxData(c.appId, pageAdded);
+    EXPECT_EQ(c.pageAddedBefore, pageAdded) << c.appId;  // never cleared, not set here
+    EXPECT_EQ(c.place, PlaceOf(c.appId));
+  }
+  EXPECT_EQ("1", db->Value("SELECT count(*) FROM Pages"));
+}
+
+TEST_F(PlacementTest, NewAppNeverFillsAHole) {
+  int page = AddPage(apps, 1);
+  AddBox(page, "a", 1, 1);
+  AddBox(page, "c", 3, 1);
+  bool pageAdded = false;
+  store.InsertBoxData("d", pageAdded);
+  EXPECT_EQ("1:4,1", PlaceOf("d"));
+}
+
+TEST_F(PlacementTest, TheLastPageIsTheOneNumberedHighest) {
+  int second = AddPage(apps, 2);
+  int first = AddPage(apps, 1);
+  AddBox(first, "a", 4, 9);
+  AddBox(second, "b", 1, 1);
+  AddBox(AddPage(2, 3), "other menu", 4, 4);
+  AddBox(AddPage(apps, 9, true), "folder 1", 4, 4);
+  bool pageAdded = false;
+  store.InsertBoxData("c", pageAdded);
+  EXPECT_EQ("2:2,1", PlaceOf("c"));
+}
+
+TEST_F(PlacementTest, AnEmptyLastPageTakesTheAppInItsFirstCell) {
+  AddBox(AddPage(apps, 1), "a", 2, 2);
+  AddPage(apps, 2);
+  bool pageAdded = false;
+  store.InsertBoxData("b", pageAdded);
+  EXPECT_EQ("2:1,1", PlaceOf("b"));
+  EXPECT_FALSE(pageAdded);
+}
+
+TEST_F(PlacementTest, ALastBoxInRowZeroStartsANewPage) {
+  int page = AddPage(apps, 3);
+  AddBox(page, "a", 4, 0);
+  bool pageAdded = false;
+  store.InsertBoxData("b", pageAdded);
+  EXPECT_TRUE(pageAdded);
+  EXPECT_EQ("4:1,1", PlaceOf("b"));
+
+  // Short of the last column, row 0 is simply followed.
+  AddBox(AddPage(apps, 5), "c", 2, 0);
+  store.InsertBoxData("d", pageAdded);
+  EXPECT_EQ("5:3,0", PlaceOf("d"));
+}
+
+TEST_F(PlacementTest, AFullPageOfFortyThousandRowsWrapsToANewPage) {
+  FillPage(AddPage(apps, 1), 160000);
+  bool pageAdded = false;
+  store.InsertBoxData("next", pageAdded);
+  EXPECT_TRUE(pageAdded);
+  EXPECT_EQ("2:1,1", PlaceOf("next"));
+  EXPECT_EQ("4,40000", CellOf("app159999"));  // the page was full
+}
+
+// ---- Deactivated applications: any menu, and two rows more before a wrap
+
+TEST_F(PlacementTest, DeactivatedAppGoesToTheEndOfTheGivenMenu) {
+  int other = AddMenu("Other");
+  EXPECT_GT(store.InsertBoxDataForDeactivatedApp(other, "a"), 0);
+  EXPECT_EQ((std::vector<Row>{{"0", std::to_string(other), "1"}}),
+            db->Rows("SELECT isFolder, parentId, pageNo FROM Pages"));
+  store.InsertBoxDataForDeactivatedApp(other, "b");
+  EXPECT_EQ("1:2,1", PlaceOf("b"));
+}
+
+TEST_F(PlacementTest, DeactivatedAppWrapsOnlyAfterRow40002) {
+  int page = AddPage(apps, 1);
+  FillPage(page, 160000);
+  store.InsertBoxDataForDeactivatedApp(apps, "row 40001");
+  EXPECT_EQ("1:1,40001", PlaceOf("row 40001"));
+
+  AddBox(page, "last", 4, 40002);
+  store.InsertBoxDataForDeactivatedApp(apps, "wrapped");
+  EXPECT_EQ("2:1,1", PlaceOf("wrapped"));
+}
+
+TEST_F(PlacementTest, DeletingADeactivatedAppPacksTheMenuWithoutGaps) {
+  int first = AddPage(apps, 1);
+  int second = AddPage(apps, 2);
+  int gone = AddBox(first, "a", 1, 1);
+  AddBox(first, "b", 3, 1);
+  AddBox(second, "c", 2, 5);
+
+  EXPECT_EQ(1, store.DeleteBoxDataForDeactivatedApp(apps, gone));
+  EXPECT_EQ("1:1,1", PlaceOf("b"));
+  EXPECT_EQ("1:2,1", PlaceOf("c"));
+  EXPECT_EQ("1", db->Value("SELECT count(*) FROM Pages"));
+
+  // An unknown box still packs the menu.
+  db->Exec("UPDATE Boxes SET col = 4 WHERE appId = 'c'");
+  EXPECT_EQ(1, store.DeleteBoxDataForDeactivatedApp(apps, 999));
+  EXPECT_EQ("1:2,1", PlaceOf("c"));
+}
+
+}  // namespace
