@@ -17,7 +17,7 @@ std::ostream& operator<<(std::ostream& out, const EngineLog& log) {
              << log.message << "\"}";
 }
 
-SimTest::SimTest() : device(sim::Device::Get()) {
+SimTest::SimTest() : device(sim::Device::Get()), handlesAtStart(device.OpenHandles()) {
   char pattern[] = "/tmp/korrin-test-XXXXXX";
   const char* made = mkdtemp(pattern);
   if (made == NULL) {
@@ -74,3 +74,5 @@ std::vector<EngineLog> SimTest::EngineLogs() const {
   }
   return logs;
 }
+
+int SimTest::HandlesOpenedByTest() const { return device.OpenHandles() - handlesAtStart; }

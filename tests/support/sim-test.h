@@ -31,9 +31,13 @@ class SimTest : public ::testing::Test {
   // Lines the engine logged under "korrin" since the last ClearLogs, taken
   // apart; a line without the exact prefix fails the test.
   std::vector<EngineLog> EngineLogs() const;
+  // Platform handles opened since the test began and not released yet;
+  // handles held from before (a library global's client) do not count.
+  int HandlesOpenedByTest() const;
 
   sim::Device& device;
   std::string root;
+  int handlesAtStart;
 };
 
 #endif  // KORRIN_TESTS_SUPPORT_SIM_TEST_H_

@@ -1,0 +1,124 @@
+// The simulated device as a whole: injected failures, call counts, what Reset
+// forgets and keeps, and the sample device.
+#include <E_DBus.h>
+#include <app_manager.h>
+#include <app_preference.h>
+#include <bundle.h>
+#include <mdm.h>
+#include <package_manager.h>
+#include <system_info.h>
+
+#include <stdexcept>
+
+#include "support/sim-test.h"
+
+namespace {
+
+class DeviceTest : public SimTest {
+ protected:
+  int OpenRacer() {
+    app_info_h info = NULL;
+    int rc = app_info_create("com.ex.racer", &info);
+    if (rc == APP_MANAGER_ERROR_NONE) app_info_destroy(info);
+    return rc;
+  }
+};
+
+TEST_F(DeviceTest, FailNextFailsOneCallAfterTheSkippedOnes) {
+  device.AddGame("com.ex.racer", "Racer");
+  device.FailNext("app_info_create", APP_MANAGER_ERROR_IO_ERROR, 1);
+  EXPECT_EQ(APP_MANAGER_ERROR_NONE, OpenRacer());
+  EXPECT_EQ(APP_MANAGER_ERROR_IO_ERROR, OpenRacer());
+  EXPECT_EQ(APP_MANAGER_ERROR_NONE, OpenRacer());
+  EXPECT_EQ(3, device.CallCount("app_info_create"));
+  EXPECT_EQ(2, device.CallCount("app_info_destroy"));
+}
+
+TEST_F(DeviceTest, FailAlwaysHoldsUntilCleared) {
+  device.AddGame("com.ex.racer", "Racer");
+  device.FailAlways("app_info_create", APP_MANAGER_ERROR_DB_FAILED);
+  EXPECT_EQ(APP_MANAGER_ERROR_DB_FAILED, OpenRacer());
+  EXPECT_EQ(APP_MANAGER_ERROR_DB_FAILED, OpenRacer());
+  device.ClearFailures();
+  EXPECT_EQ(APP_MANAGER_ERROR_NONE, OpenRacer());
+  EXPECT_EQ(0, HandlesOpenedByTest());
+}
+
+TEST_F(DeviceTest, CallsWithoutAnErrorCodeFailTheirOwnWay) {
+  device.FailNext("bundle_create", BUNDLE_ERROR_OUT_OF_MEMORY);
+  EXPECT_EQ(nullptr, bundle_create());
+  EXPECT_EQ(BUNDLE_ERROR_OUT_OF_MEMORY, get_last_result());
+  device.FailNext("e_dbus_init", -1);
+  EXPECT_EQ(0, e_dbus_init());
+  device.FailNext("mdm_get_application_state", APP_MANAGER_ERROR_IO_ERROR);
+  mdm_get_service();
+  EXPECT_EQ(MDM_STATUS_ERROR, mdm_get_application_state("com.ex.racer"));
+  mdm_release_service();
+}
+
+TEST_F(DeviceTest, UnknownCallNamesAreATestMistake) {
+  EXPECT_THROW(device.FailNext("app_info_get_lable", -5), std::invalid_argument);
+  EXPECT_THROW(device.FailAlways("e_dbus_shutdown", -5), std::invalid_argument);  // void
+  EXPECT_THROW(device.FailNext("app_info_create", 0), std::invalid_argument);
+  EXPECT_THROW(device.CallCount("nothing"), std::invalid_argument);
+  EXPECT_EQ(0, device.CallCount("e_dbus_shutdown"));
+}
+
+TEST_F(DeviceTest, ResetForgetsTheDeviceButKeepsHeldHandles) {
+  package_manager_h client = NULL;
+  ASSERT_EQ(PACKAGE_MANAGER_ERROR_NONE, package_manager_create(&client));
+  static int heard = 0;
+  heard = 0;
+  package_manager_set_event_cb(
+      client,
+      [](const char*, const char*, package_manager_event_type_e, package_manager_event_state_e, int,
+         package_manager_error_e, void*) { ++heard; },
+      NULL);
+  device.AddGame("com.ex.racer", "Racer");
+  device.SetPreference("memory/sysman/mmc", 1);
+  device.FailAlways("app_info_create", -5);
+
+  device.Reset();
+  EXPECT_TRUE(device.Packages().empty());
+  int value = 0;
+  EXPECT_EQ(PREFERENCE_ERROR_NO_KEY, preference_get_int("memory/sysman/mmc", &value));
+  EXPECT_EQ(0, device.CallCount("app_info_create"));
+  EXPECT_EQ(1, device.PackageListeners());
+  device.Install(sim::MakePackage("com.ex.new", {sim::GameApp("com.ex.new", "New")}));
+  EXPECT_EQ(3, heard);
+  EXPECT_EQ(APP_MANAGER_ERROR_NONE, [] {
+    app_info_h info = NULL;
+    int rc = app_info_create("com.ex.new", &info);
+    app_info_destroy(info);
+    return rc;
+  }());
+  EXPECT_EQ(PACKAGE_MANAGER_ERROR_NONE, package_manager_destroy(client));
+}
+
+TEST_F(DeviceTest, SampleDeviceIsALivedInPhone) {
+  device.LoadSampleDevice();
+  int games = 0, others = 0, noDisplay = 0, withoutIcon = 0, deactivated = 0;
+  for (const sim::Package& pkg : device.Packages()) {
+    if (pkg.disabled) ++deactivated;
+    for (const sim::App& app : pkg.apps) {
+      if (app.noDisplay) {
+        ++noDisplay;
+      } else if (app.game) {
+        ++games;
+        if (!app.icon) ++withoutIcon;
+      } else {
+        ++others;
+      }
+    }
+  }
+  EXPECT_GE(games, 30);
+  EXPECT_GE(others, 4);
+  EXPECT_EQ(2, noDisplay);
+  EXPECT_EQ(1, withoutIcon);
+  EXPECT_EQ(1, deactivated);
+  int width = 0;
+  EXPECT_EQ(0, system_info_get_platform_int("http://tizen.org/feature/screen.width", &width));
+  EXPECT_EQ(720, width);
+}
+
+}  // namespace

@@ -1,0 +1,192 @@
+// The simulated package manager: package information, package filters, and
+// the events of installs, updates and uninstalls as a listener hears them.
+#include <app_manager.h>
+#include <package_manager.h>
+
+#include <sstream>
+
+#include "support/sim-test.h"
+
+namespace {
+
+// What a listening client heard, one line per event, with whether the
+// package's first application could be opened at that moment.
+struct Heard {
+  std::vector<std::string> events;
+  std::string appId;
+};
+
+void Listen(const char* type, const char* package, package_manager_event_type_e eventType,
+            package_manager_event_state_e eventState, int progress, package_manager_error_e error,
+            void* user_data) {
+  Heard* heard = static_cast<Heard*>(user_data);
+  app_info_h info = NULL;
+  bool readable = app_info_create(heard->appId.c_str(), &info) == APP_MANAGER_ERROR_NONE;
+  if (readable) app_info_destroy(info);
+  std::ostringstream line;
+  line << type << " " << package << " " << eventType << " " << eventState << " " << progress << " "
+       << error << (readable ? " readable" : "");
+  heard->events.push_back(line.str());
+}
+
+class PackageTest : public SimTest {
+ protected:
+  PackageTest() {
+    EXPECT_EQ(PACKAGE_MANAGER_ERROR_NONE, package_manager_create(&client));
+    EXPECT_EQ(PACKAGE_MANAGER_ERROR_NONE, package_manager_set_event_cb(client, Listen, &heard));
+  }
+  ~PackageTest() override { package_manager_destroy(client); }
+
+  static bool CollectApp(package_info_app_component_type_e type, const char* appId, void* apps) {
+    static_cast<std::vector<std::string>*>(apps)->push_back(std::string(appId) + ":" +
+                                                            std::to_string(type));
+    return true;
+  }
+
+  static bool CollectPackage(package_info_h pkg, void* apps) {
+    package_info_foreach_app_from_package(pkg, PACKAGE_INFO_ALLAPP, CollectApp, apps);
+    return true;
+  }
+
+  package_manager_h client = NULL;
+  Heard heard;
+};
+
+TEST_F(PackageTest, PackageInformationGivesFlagsAndAppsByComponent) {
+  sim::App service = sim::PlainApp("com.ex.pack.sync", "Sync");
+  service.component = PACKAGE_INFO_SERVICEAPP;
+  sim::Package pkg = sim::MakePackage("com.ex.pack", {sim::GameApp("com.ex.pack.a", "A"), service,
+                                                      sim::GameApp("com.ex.pack.b", "B")});
+  pkg.system = true;
+  pkg.removable = false;
+  device.AddPackage(pkg);
+
+  package_info_h info = NULL;
+  ASSERT_EQ(PACKAGE_MANAGER_ERROR_NONE, package_info_create("com.ex.pack", &info));
+  bool flag = false;
+  EXPECT_EQ(PACKAGE_MANAGER_ERROR_NONE, package_info_is_system_package(info, &flag));
+  EXPECT_TRUE(flag);
+  EXPECT_EQ(PACKAGE_MANAGER_ERROR_NONE, package_info_is_removable_package(info, &flag));
+  EXPECT_FALSE(flag);
+  EXPECT_EQ(PACKAGE_MANAGER_ERROR_NONE, package_info_is_preload_package(info, &flag));
+  EXPECT_FALSE(flag);
+
+  struct {
+    package_info_app_component_type_e type;
+    std::vector<std::string> apps;
+  } cases[] = {
+      {PACKAGE_INFO_ALLAPP, {"com.ex.pack.a:1", "com.ex.pack.sync:2", "com.ex.pack.b:1"}},
+      {PACKAGE_INFO_UIAPP, {"com.ex.pack.a:1", "com.ex.pack.b:1"}},
+      {PACKAGE_INFO_SERVICEAPP, {"com.ex.pack.sync:2"}},
+  };
+  for (const auto& c : cases) {
+    std::vector<std::string> apps;
+    EXPECT_EQ(PACKAGE_MANAGER_ERROR_NONE,
+              package_info_foreach_app_from_package(info, c.type, CollectApp, &apps));
+    EXPECT_EQ(c.apps, apps) << c.type;
+  }
+  EXPECT_EQ(PACKAGE_MANAGER_ERROR_NONE, package_info_destroy(info));
+
+  EXPECT_EQ(PACKAGE_MANAGER_ERROR_NO_SUCH_PACKAGE,
+            package_manager_get_package_info("com.ex.none", &info));
+  EXPECT_EQ(1, HandlesOpenedByTest());  // the fixture's client
+}
+
+TEST_F(PackageTest, PackageFilterSelectsDeactivatedAndPreloadedPackages) {
+  device.AddGame("com.ex.plain", "Plain");
+  sim::Package off = sim::MakePackage("com.ex.off", {sim::GameApp("com.ex.off", "Off")});
+  off.supportDisable = off.disabled = true;
+  device.AddPackage(off);
+  sim::Package pre = sim::MakePackage("com.ex.pre", {sim::GameApp("com.ex.pre", "Pre")});
+  pre.preload = pre.supportDisable = true;
+  device.AddPackage(pre);
+
+  struct {
+    std::vector<const char*> properties;
+    std::vector<std::string> apps;
+  } cases[] = {
+      {{}, {"com.ex.plain:1", "com.ex.off:1", "com.ex.pre:1"}},
+      {{PACKAGE_MANAGER_PKGINFO_PROP_SUPPORT_DISABLE, PACKAGE_MANAGER_PKGINFO_PROP_DISABLE},
+       {"com.ex.off:1"}},
+      {{PACKAGE_MANAGER_PKGINFO_PROP_READONLY}, {"com.ex.pre:1"}},
+      {{PACKAGE_MANAGER_PKGINFO_PROP_PRELOAD, PACKAGE_MANAGER_PKGINFO_PROP_DISABLE}, {}},
+  };
+  for (const auto& c : cases) {
+    package_manager_filter_h filter = NULL;
+    ASSERT_EQ(PACKAGE_MANAGER_ERROR_NONE, package_manager_filter_create(&filter));
+    for (const char* property : c.properties) {
+      EXPECT_EQ(PACKAGE_MANAGER_ERROR_NONE,
+                package_manager_filter_add_bool(filter, property, true));
+    }
+    std::vector<std::string> apps;
+    EXPECT_EQ(PACKAGE_MANAGER_ERROR_NONE,
+              package_manager_filter_foreach_package_info(filter, CollectPackage, &apps));
+    EXPECT_EQ(c.apps, apps);
+    package_manager_filter_destroy(filter);
+  }
+}
+
+TEST_F(PackageTest, OperationsSendTheirEventsAroundTheChange) {
+  sim::Package racer = sim::MakePackage("com.ex.racer", {sim::GameApp("com.ex.racer", "Racer")});
+  heard.appId = "com.ex.racer";
+
+  device.Install(racer);
+  device.Update(racer);
+  EXPECT_TRUE(device.Uninstall("com.ex.racer"));
+  EXPECT_FALSE(device.Uninstall("com.ex.racer"));  // nothing sent
+
+  EXPECT_EQ((std::vector<std::string>{
+                "tpk com.ex.racer 0 0 0 0",
+                "tpk com.ex.racer 0 1 60 0",
+                "tpk com.ex.racer 0 2 100 0 readable",
+                "tpk com.ex.racer 2 0 0 0 readable",
+                "tpk com.ex.racer 2 1 60 0 readable",
+                "tpk com.ex.racer 2 2 100 0 readable",
+                "tpk com.ex.racer 1 0 0 0 readable",  // uninstall starts while readable
+                "tpk com.ex.racer 1 1 60 0 readable",
+                "tpk com.ex.racer 1 2 100 0",
+            }),
+            heard.events);
+}
+
+TEST_F(PackageTest, UpdateReplacesThePackageBeforeCompletion) {
+  device.AddGame("com.ex.racer", "Racer");
+  sim::Package renamed = *device.FindPackage("com.ex.racer");
+  renamed.apps[0].label = "Racer Deluxe";
+  device.Update(renamed);
+  ASSERT_EQ(1u, device.Packages().size());
+  EXPECT_EQ("Racer Deluxe", *device.Packages()[0].apps[0].label);
+}
+
+TEST_F(PackageTest, RawEventsReachListenersAsGiven) {
+  device.EmitPackageEvent("wgt", "com.ex.ghost", PACKAGE_MANAGER_EVENT_TYPE_INSTALL,
+                          PACKAGE_MANAGER_EVENT_STATE_FAILED, 30, PACKAGE_MANAGER_ERROR_IO_ERROR);
+  device.EmitPackageEvent("tpk", "com.ex.ghost", 3, PACKAGE_MANAGER_EVENT_STATE_STARTED);
+  EXPECT_EQ((std::vector<std::string>{"wgt com.ex.ghost 0 3 30 -5", "tpk com.ex.ghost 3 0 0 0"}),
+            heard.events);
+}
+
+TEST_F(PackageTest, ClientsHearOnlyWhatTheyAskFor) {
+  Heard second;
+  package_manager_h other = NULL;
+  ASSERT_EQ(PACKAGE_MANAGER_ERROR_NONE, package_manager_create(&other));
+  package_manager_set_event_cb(other, Listen, &second);
+  EXPECT_EQ(2, device.PackageListeners());
+
+  ASSERT_EQ(PACKAGE_MANAGER_ERROR_NONE,
+            package_manager_set_event_status(other, PACKAGE_MANAGER_STATUS_TYPE_UNINSTALL));
+  device.AddGame("com.ex.old", "Old");
+  device.Install(sim::MakePackage("com.ex.new", {sim::GameApp("com.ex.new", "New")}));
+  device.Uninstall("com.ex.old");
+  EXPECT_EQ(6u, heard.events.size());
+  EXPECT_EQ(3u, second.events.size());
+
+  package_manager_unset_event_cb(client);
+  EXPECT_EQ(1, device.PackageListeners());
+  package_manager_destroy(other);
+  EXPECT_EQ(0, device.PackageListeners());
+  device.Uninstall("com.ex.new");
+  EXPECT_EQ(6u, heard.events.size());
+}
+
+}  // namespace
