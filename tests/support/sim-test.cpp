@@ -76,3 +76,12 @@ std::vector<EngineLog> SimTest::EngineLogs() const {
 }
 
 int SimTest::HandlesOpenedByTest() const { return device.OpenHandles() - handlesAtStart; }
+
+std::vector<std::string> SimTest::EngineMessages() const {
+  std::vector<std::string> messages;
+  for (const EngineLog& log : EngineLogs()) {
+    const char* letter = log.priority == 5 ? "W" : log.priority == 6 ? "E" : "?";
+    messages.push_back(std::string(letter) + " " + log.message);
+  }
+  return messages;
+}

@@ -31,6 +31,9 @@ class SimTest : public ::testing::Test {
   // Lines the engine logged under "korrin" since the last ClearLogs, taken
   // apart; a line without the exact prefix fails the test.
   std::vector<EngineLog> EngineLogs() const;
+  // The same, each as its priority letter and message: "W # BEGIN",
+  // "E app_info_create return [-5]".
+  std::vector<std::string> EngineMessages() const;
   // Platform handles opened since the test began and not released yet;
   // handles held from before (a library global's client) do not count.
   int HandlesOpenedByTest() const;

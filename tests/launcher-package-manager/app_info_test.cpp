@@ -1,0 +1,222 @@
+// Reading one application's information, and the cache that shares the
+// records it filled.
+#include <app_manager.h>
+#include <package_manager.h>
+
+#include "package-manager-test.h"
+
+namespace {
+
+class AppInfoTest : public PackageManagerTest {
+ protected:
+  AppInfoTest() {
+    sim::Package racer = sim::MakePackage("com.ex.racer", {sim::GameApp("com.ex.racer", "Racer")});
+    racer.preload = true;
+    racer.removable = false;
+    device.AddPackage(racer);
+  }
+};
+
+TEST_F(AppInfoTest, ReadingFillsTheRecordAndCachesThatVeryRecord) {
+  boost::shared_ptr<GameBoxData> box = NewBox();
+  box->boxId = 7;
+  box->isNewBadge = box->isUpdatable = box->isSelected = box->isMdmRestricted = true;
+  box->appSize = 99;
+
+  ASSERT_TRUE(manager._GetAppInfo("com.ex.racer", box));
+  EXPECT_EQ("com.ex.racer", box->pkgId);
+  EXPECT_EQ("com.ex.racer", box->appId);
+  EXPECT_EQ("capp", box->pkgType);
+  EXPECT_EQ("Racer", box->name);
+  EXPECT_EQ("/opt/usr/share/icons/default/small/com.ex.racer.png", box->iconPath);
+  EXPECT_FALSE(box->isNoDisplay);
+  EXPECT_TRUE(box->isEnabled);
+  EXPECT_FALSE(box->isRemovable);
+  EXPECT_TRUE(box->isPreload);
+  EXPECT_FALSE(box->isSystem);
+  EXPECT_EQ(0, box->appSize);
+  EXPECT_FALSE(box->isMdmRestricted);
+  EXPECT_EQ(7, box->boxId);  // not the reading's business
+  EXPECT_TRUE(box->isNewBadge && box->isUpdatable && box->isSelected);
+
+  ASSERT_EQ(1u, manager.m_appInfoCache.size());
+  EXPECT_EQ(box.get(), manager.m_appInfoCache["com.ex.racer"].get());
+  EXPECT_EQ((std::vector<std::string>{
+                "E  app_info_get_type appid[com.ex.racer] pkg_id[com.ex.racer] pkg_type[capp]",
+                "E Name[Racer] enable[1] system[0]"}),
+            EngineMessages());
+  EXPECT_EQ("_GetAppInfo", EngineLogs()[0].function);
+  EXPECT_EQ(0, LeftOpen());
+}
+
+TEST_F(AppInfoTest, MissingOrEmptyIconGetsTheDefault) {
+  struct {
+    std::optional<std::string> icon;
+    std::string expected;
+  } cases[] = {
+      {std::nullopt, DefaultIcon()},
+      {std::string(""), DefaultIcon()},
+      {std::string("/icons/racer.png"), "/icons/racer.png"},
+  };
+  for (const auto& c : cases) {
+    device.FindApp("com.ex.racer")->icon = c.icon;
+    boost::shared_ptr<GameBoxData> box = NewBox();
+    ASSERT_TRUE(manager._GetAppInfo("com.ex.racer", box));
+    EXPECT_EQ(c.expected, box->iconPath);
+  }
+}
+
+TEST_F(AppInfoTest, NullLabelLeavesTheNameAsItWas) {
+  device.FindApp("com.ex.racer")->label.reset();
+  boost::shared_ptr<GameBoxData> box = NewBox();
+  box->name = "Kept";
+  ASSERT_TRUE(manager._GetAppInfo("com.ex.racer", box));
+  EXPECT_EQ("Kept", box->name);
+  EXPECT_EQ("E Name[(null)] enable[1] system[0]", EngineMessages().back());
+}
+
+TEST_F(AppInfoTest, DisabledApplicationIsReadAsNotEnabled) {
+  device.FindApp("com.ex.racer")->enabled = false;
+  boost::shared_ptr<GameBoxData> box = NewBox();
+  ASSERT_TRUE(manager._GetAppInfo("com.ex.racer", box));
+  EXPECT_FALSE(box->isEnabled);
+  EXPECT_EQ("E Name[Racer] enable[0] system[0]", EngineMessages().back());
+}
+
+TEST_F(AppInfoTest, NoDisplayApplicationIsRefusedUntouched) {
+  device.FindApp("com.ex.racer")->noDisplay = true;
+  boost::shared_ptr<GameBoxData> box = NewBox();
+  EXPECT_FALSE(manager._GetAppInfo("com.ex.racer", box));
+  EXPECT_EQ("", box->appId);
+  EXPECT_EQ("", box->name);
+  EXPECT_TRUE(manager.m_appInfoCache.empty());
+  EXPECT_EQ((std::vector<std::string>{"E app[com.ex.racer] is nodisplay app"}), EngineMessages());
+  EXPECT_EQ(0, LeftOpen());
+}
+
+// ---- Failure paths: one platform call fails; nothing is filled, nothing
+// cached, and no handle stays open.
+
+TEST_F(AppInfoTest, EveryFailingCallIsLoggedAndReportedAsFalse) {
+  const std::string type =
+      "E  app_info_get_type appid[com.ex.racer] pkg_id[com.ex.racer] "
+      "pkg_type[capp]";
+  const std::string failed = "E AppId[com.ex.racer] failed to get pkginfo";
+  const int io = APP_MANAGER_ERROR_IO_ERROR;
+  const int db = APP_MANAGER_ERROR_DB_FAILED;
+  struct {
+    const char* call;
+    int error;
+    std::vector<std::string> logs;
+  } cases[] = {
+      {"app_info_create", db, {"E app_info_create return [-17891325]"}},
+      {"app_info_get_app_id",
+       io,
+       {"E app_info_get_app_id return [-5]", "E AppId[(null)] failed to get pkginfo"}},
+      {"app_info_is_nodisplay", io, {"E app_info_is_nodisplay return [-5]", failed}},
+      {"app_info_get_package", io, {"E app_info_get_package return [-5]", failed}},
+      {"app_info_get_icon", io, {"E app_info_get_icon return [-5]", failed}},
+      {"app_info_get_label", io, {"E app_info_get_label return [-5]", failed}},
+      // The enabled read reports itself with the label's text.
+      {"app_info_is_enabled", db, {"E app_info_get_label return [-17891325]", failed}},
+      {"app_info_get_type", io, {"E app_info_get_type return [-5]", failed}},
+      // The package information is opened with package_info_create, though the
+      // text names the package manager's call.
+      {"package_info_create",
+       PACKAGE_MANAGER_ERROR_NO_SUCH_PACKAGE,
+       {type, "E package_manager_get_package_info return [-18153359]", failed}},
+      {"package_info_is_system_package",
+       PACKAGE_MANAGER_ERROR_IO_ERROR,
+       {type, "E package_info_is_system_package return [-5]", failed}},
+      {"package_info_is_removable_package",
+       PACKAGE_MANAGER_ERROR_IO_ERROR,
+       {type, "E package_info_is_removable_package return [-5]", failed}},
+      {"package_info_is_preload_package",
+       PACKAGE_MANAGER_ERROR_IO_ERROR,
+       {type, "E package_info_is_preload_package return [-5]", failed}},
+  };
+  for (const auto& c : cases) {
+    SCOPED_TRACE(c.call);
+    device.ClearLogs();
+    device.FailNext(c.call, c.error);
+    boost::shared_ptr<GameBoxData> box = NewBox();
+    EXPECT_FALSE(manager._GetAppInfo("com.ex.racer", box));
+    EXPECT_EQ(c.logs, EngineMessages());
+    EXPECT_EQ("", box->name);
+    EXPECT_EQ("", box->pkgId);
+    EXPECT_TRUE(manager.m_appInfoCache.empty());
+    EXPECT_EQ(0, LeftOpen());
+  }
+}
+
+// ---- The cache.
+
+TEST_F(AppInfoTest, SecondRequestIsAnsweredFromTheCache) {
+  boost::shared_ptr<GameBoxData> first = NewBox();
+  ASSERT_TRUE(manager.GetAppInfo("com.ex.racer", first));
+  first->isLocked = first->isOnStorageCard = first->isUpdatable = true;
+  first->isNewBadge = first->isSelected = true;
+  first->badgeCount = 4;
+  device.ClearLogs();
+
+  boost::shared_ptr<GameBoxData> second = NewBox();
+  second->appId = "as the caller had it";
+  second->boxId = 12;
+  second->col = 3;
+  ASSERT_TRUE(manager.GetAppInfo("com.ex.racer", second));
+  EXPECT_EQ(1, device.CallCount("app_info_create"));
+  EXPECT_EQ((std::vector<std::string>{"E Find a App Info Name[Racer] enable[1] system[0]"}),
+            EngineMessages());
+  EXPECT_EQ("Racer", second->name);
+  EXPECT_EQ("com.ex.racer", second->pkgId);
+  EXPECT_EQ("capp", second->pkgType);
+  EXPECT_TRUE(second->isPreload);
+  EXPECT_TRUE(second->isLocked && second->isOnStorageCard && second->isUpdatable);
+  // Placement, appId, the third and sixth flags and the badge stay the caller's.
+  EXPECT_EQ("as the caller had it", second->appId);
+  EXPECT_EQ(12, second->boxId);
+  EXPECT_EQ(3, second->col);
+  EXPECT_FALSE(second->isNewBadge || second->isSelected);
+  EXPECT_EQ(0, second->badgeCount);
+  // The cache still holds the first record, which the caller may change.
+  first->name = "Renamed by the launcher";
+  ASSERT_TRUE(manager.GetAppInfo("com.ex.racer", second));
+  EXPECT_EQ("Renamed by the launcher", second->name);
+}
+
+TEST_F(AppInfoTest, EntryWithoutNameOrIconIsDroppedAndReadAfresh) {
+  for (std::string GameBoxData::*field : {&GameBoxData::name, &GameBoxData::iconPath}) {
+    manager.m_appInfoCache.clear();
+    boost::shared_ptr<GameBoxData> first = NewBox();
+    ASSERT_TRUE(manager.GetAppInfo("com.ex.racer", first));
+    int reads = device.CallCount("app_info_create");
+    (*first).*field = "";
+
+    boost::shared_ptr<GameBoxData> second = NewBox();
+    ASSERT_TRUE(manager.GetAppInfo("com.ex.racer", second));
+    EXPECT_EQ(reads + 1, device.CallCount("app_info_create"));
+    EXPECT_EQ(second.get(), manager.m_appInfoCache["com.ex.racer"].get());
+    EXPECT_EQ("Racer", second->name);
+  }
+}
+
+TEST_F(AppInfoTest, FailedRereadLeavesNoEntry) {
+  boost::shared_ptr<GameBoxData> first = NewBox();
+  ASSERT_TRUE(manager.GetAppInfo("com.ex.racer", first));
+  first->name = "";
+  device.FailNext("app_info_create", APP_MANAGER_ERROR_IO_ERROR);
+  EXPECT_FALSE(manager.GetAppInfo("com.ex.racer", NewBox()));
+  EXPECT_TRUE(manager.m_appInfoCache.empty());
+}
+
+TEST_F(AppInfoTest, GetAppNameAlwaysAsksThePlatform) {
+  ASSERT_TRUE(manager.GetAppInfo("com.ex.racer", NewBox()));
+  device.FindApp("com.ex.racer")->label = "Racer 2";
+  boost::shared_ptr<GameBoxData> box = NewBox();
+  ASSERT_TRUE(manager.GetAppName("com.ex.racer", box));
+  EXPECT_EQ("Racer 2", box->name);
+  EXPECT_EQ(2, device.CallCount("app_info_create"));
+  EXPECT_EQ(box.get(), manager.m_appInfoCache["com.ex.racer"].get());
+}
+
+}  // namespace

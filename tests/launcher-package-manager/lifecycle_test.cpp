@@ -1,0 +1,121 @@
+// The manager's life (its listening client from construction to Terminate)
+// and the device-management policy.
+#include <mdm.h>
+#include <package_manager.h>
+
+#include <memory>
+
+#include "package-manager-test.h"
+
+namespace {
+
+typedef std::vector<std::string> Ids;
+
+class LifecycleTest : public PackageManagerTest {};
+
+TEST_F(LifecycleTest, ConstructionCreatesTheClientAndDestructionReleasesIt) {
+  EXPECT_NE(nullptr, manager.m_pkgMgr);
+  EXPECT_EQ(1, HandlesOpenedByTest());
+  EXPECT_EQ(0, device.PackageListeners());  // nothing registered before Initialize
+  {
+    std::unique_ptr<LauncherPackageManager> another(new LauncherPackageManager);
+    EXPECT_EQ(2, HandlesOpenedByTest());
+  }
+  EXPECT_EQ(1, HandlesOpenedByTest());
+  EXPECT_TRUE(EngineMessages().empty());
+}
+
+TEST_F(LifecycleTest, FailedClientCreationIsSilent) {
+  device.FailNext("package_manager_create", PACKAGE_MANAGER_ERROR_PERMISSION_DENIED);
+  LauncherPackageManager without;
+  EXPECT_EQ(nullptr, without.m_pkgMgr);
+  EXPECT_FALSE(without.m_isListenPaused);
+  EXPECT_EQ(nullptr, without.m_dbusConnection);
+  EXPECT_EQ(nullptr, without.m_bootSignalHandler);
+  EXPECT_TRUE(without.Terminate());
+  EXPECT_TRUE(EngineMessages().empty());
+}
+
+TEST_F(LifecycleTest, TerminateReleasesTheClientOnce) {
+  EXPECT_TRUE(manager.Terminate());
+  EXPECT_EQ(nullptr, manager.m_pkgMgr);
+  EXPECT_EQ(0, HandlesOpenedByTest());
+  EXPECT_TRUE(manager.Terminate());
+  EXPECT_EQ(1, device.CallCount("package_manager_destroy"));
+}
+
+TEST_F(LifecycleTest, TerminateKeepsTheClientWhenReleaseFails) {
+  struct {
+    const char* call;
+    int destroys;  // destroy calls made by the failing Terminate
+  } cases[] = {{"package_manager_unset_event_cb", 0}, {"package_manager_destroy", 1}};
+  for (const auto& c : cases) {
+    SCOPED_TRACE(c.call);
+    LauncherPackageManager other;
+    device.ClearLogs();
+    int destroys = device.CallCount("package_manager_destroy");
+    device.FailNext(c.call, PACKAGE_MANAGER_ERROR_IO_ERROR);
+    EXPECT_FALSE(other.Terminate());
+    EXPECT_NE(nullptr, other.m_pkgMgr);
+    EXPECT_EQ(destroys + c.destroys, device.CallCount("package_manager_destroy"));
+    EXPECT_EQ(Ids{"E cannot free pkgmgr_client for listen."}, EngineMessages());
+    EXPECT_EQ("Terminate", EngineLogs()[0].function);
+  }
+  EXPECT_EQ(1, HandlesOpenedByTest());  // each destructor tried again, and succeeded
+}
+
+TEST_F(LifecycleTest, EveryOperationGivesItsHandlesBack) {
+  device.LoadSampleDevice();
+  Ids ids;
+  manager.GetAppIdList(ids);
+  ASSERT_FALSE(ids.empty());
+  manager.GetAppInfo(ids[0], NewBox());
+  manager.GetAppName(ids[0], NewBox());
+  manager._GetAppIds("com.starwick.tilepack");
+  manager._IsMenuLaunch("com.glowmark.runeledger");
+  manager._IsMenuLaunch("com.velmora.calculator");
+  Ids deactivated = manager._GetDeactivatedAppIds();
+  ASSERT_EQ(Ids{"com.frostpath.turbotortoise"}, deactivated);
+  manager._GetDeactivatedAppInfo(deactivated[0], NewBox());
+  manager.IsMDMAllowed(ids[0]);
+  manager.Terminate();
+  EXPECT_EQ(0, HandlesOpenedByTest()) << testing::PrintToString(device.OpenHandlesByKind());
+}
+
+// ---- Device-management policy.
+
+TEST_F(LifecycleTest, PolicyAllowsUnlessTheServiceSaysOtherwise) {
+  struct {
+    const char* name;
+    bool reachable;
+    mdm_status_t state;
+    bool allowed;
+    Ids logs;
+  } cases[] = {
+      {"allowed", true, MDM_ALLOWED, true, {}},
+      {"restricted", true, MDM_RESTRICTED, false, {"E app[com.ex.racer] is not mdm allowed"}},
+      {"any other state",
+       true,
+       MDM_STATUS_ERROR,
+       false,
+       {"E app[com.ex.racer] is not mdm allowed"}},
+      {"unreachable", false, MDM_RESTRICTED, true, {"E mdm_get_service() is failed"}},
+  };
+  for (const auto& c : cases) {
+    SCOPED_TRACE(c.name);
+    device.ClearLogs();
+    device.SetMdm(c.reachable, {{"com.ex.racer", c.state}});
+    EXPECT_EQ(c.allowed, manager.IsMDMAllowed("com.ex.racer"));
+    EXPECT_EQ(c.logs, EngineMessages());
+    EXPECT_EQ(0, LeftOpen());  // every connection released
+  }
+}
+
+TEST_F(LifecycleTest, RestrictionIsNeverAskedWhilePolicyChecksAreOff) {
+  device.SetMdm(true, {{"com.ex.racer", MDM_RESTRICTED}});
+  EXPECT_FALSE(manager.IsMDMRestriected("com.ex.racer"));
+  EXPECT_EQ(0, device.CallCount("mdm_get_service"));
+  EXPECT_TRUE(EngineMessages().empty());
+}
+
+}  // namespace

@@ -1,0 +1,28 @@
+// The fixture of the package tracker's tests: a manager on a fresh simulated
+// device, and a few verbs to set the device up and look at the results.
+#ifndef KORRIN_TESTS_LAUNCHER_PACKAGE_MANAGER_PACKAGE_MANAGER_TEST_H_
+#define KORRIN_TESTS_LAUNCHER_PACKAGE_MANAGER_PACKAGE_MANAGER_TEST_H_
+
+#include <boost/shared_ptr.hpp>
+
+#include "launcher-package-manager/launcher-package-manager.h"
+#include "support/sim-test.h"
+
+// The launcher's icon for applications that have none.
+inline const char* DefaultIcon() {
+  return "/opt/usr/apps/com.velmora.korrin/res/images/common/default_app_icon.png";
+}
+
+class PackageManagerTest : public SimTest {
+ protected:
+  static boost::shared_ptr<GameBoxData> NewBox() {
+    return boost::shared_ptr<GameBoxData>(new GameBoxData);
+  }
+
+  // Handles still open beyond the manager's own listening client.
+  int LeftOpen() const { return HandlesOpenedByTest() - (manager.m_pkgMgr != NULL ? 1 : 0); }
+
+  LauncherPackageManager manager;
+};
+
+#endif  // KORRIN_TESTS_LAUNCHER_PACKAGE_MANAGER_PACKAGE_MANAGER_TEST_H_
