@@ -1,5 +1,5 @@
-// The simulated package manager: package information, package filters, and
-// the events of installs, updates and uninstalls as a listener hears them.
+// The simulated package manager: package filters, and the events of installs,
+// updates and uninstalls as a listener hears them.
 #include <app_manager.h>
 #include <package_manager.h>
 
@@ -51,46 +51,6 @@ class PackageTest : public SimTest {
   package_manager_h client = NULL;
   Heard heard;
 };
-
-TEST_F(PackageTest, PackageInformationGivesFlagsAndAppsByComponent) {
-  sim::App service = sim::PlainApp("com.ex.pack.sync", "Sync");
-  service.component = PACKAGE_INFO_SERVICEAPP;
-  sim::Package pkg = sim::MakePackage("com.ex.pack", {sim::GameApp("com.ex.pack.a", "A"), service,
-                                                      sim::GameApp("com.ex.pack.b", "B")});
-  pkg.system = true;
-  pkg.removable = false;
-  device.AddPackage(pkg);
-
-  package_info_h info = NULL;
-  ASSERT_EQ(PACKAGE_MANAGER_ERROR_NONE, package_info_create("com.ex.pack", &info));
-  bool flag = false;
-  EXPECT_EQ(PACKAGE_MANAGER_ERROR_NONE, package_info_is_system_package(info, &flag));
-  EXPECT_TRUE(flag);
-  EXPECT_EQ(PACKAGE_MANAGER_ERROR_NONE, package_info_is_removable_package(info, &flag));
-  EXPECT_FALSE(flag);
-  EXPECT_EQ(PACKAGE_MANAGER_ERROR_NONE, package_info_is_preload_package(info, &flag));
-  EXPECT_FALSE(flag);
-
-  struct {
-    package_info_app_component_type_e type;
-    std::vector<std::string> apps;
-  } cases[] = {
-      {PACKAGE_INFO_ALLAPP, {"com.ex.pack.a:1", "com.ex.pack.sync:2", "com.ex.pack.b:1"}},
-      {PACKAGE_INFO_UIAPP, {"com.ex.pack.a:1", "com.ex.pack.b:1"}},
-      {PACKAGE_INFO_SERVICEAPP, {"com.ex.pack.sync:2"}},
-  };
-  for (const auto& c : cases) {
-    std::vector<std::string> apps;
-    EXPECT_EQ(PACKAGE_MANAGER_ERROR_NONE,
-              package_info_foreach_app_from_package(info, c.type, CollectApp, &apps));
-    EXPECT_EQ(c.apps, apps) << c.type;
-  }
-  EXPECT_EQ(PACKAGE_MANAGER_ERROR_NONE, package_info_destroy(info));
-
-  EXPECT_EQ(PACKAGE_MANAGER_ERROR_NO_SUCH_PACKAGE,
-            package_manager_get_package_info("com.ex.none", &info));
-  EXPECT_EQ(1, HandlesOpenedByTest());  // the fixture's client
-}
 
 TEST_F(PackageTest, PackageFilterSelectsDeactivatedAndPreloadedPackages) {
   device.AddGame("com.ex.plain", "Plain");

@@ -1,11 +1,9 @@
-// The simulated device's smaller services: preferences, system information,
-// bundles, the system bus, the device-management service and the usage-log
-// client.
+// The simulated device's smaller services: preferences, bundles, the system
+// bus, the device-management service and the usage-log client.
 #include <E_DBus.h>
 #include <app_preference.h>
 #include <bundle.h>
 #include <mdm.h>
-#include <system_info.h>
 #include <velmora_log_manager.h>
 
 #include "support/sim-test.h"
@@ -23,18 +21,6 @@ TEST_F(ServicesTest, PreferencesAnswerNoKeyUntilSet) {
   EXPECT_EQ(1, value);
   device.RemovePreference("memory/sysman/mmc");
   EXPECT_EQ(PREFERENCE_ERROR_NO_KEY, preference_get_int("memory/sysman/mmc", &value));
-}
-
-TEST_F(ServicesTest, SystemKeysAreFoundWithOrWithoutTheScheme) {
-  device.SetSystemInfo("http://tizen.org/feature/screen.width", 720);
-  int value = 0;
-  EXPECT_EQ(SYSTEM_INFO_ERROR_NONE,
-            system_info_get_platform_int("http://tizen.org/feature/screen.width", &value));
-  EXPECT_EQ(720, value);
-  EXPECT_EQ(SYSTEM_INFO_ERROR_NONE,
-            system_info_get_platform_int("tizen.org/feature/screen.width", &value));
-  EXPECT_EQ(SYSTEM_INFO_ERROR_INVALID_PARAMETER,
-            system_info_get_platform_int("http://tizen.org/feature/screen.height", &value));
 }
 
 TEST_F(ServicesTest, BundleKeepsEachKeyOnce) {
