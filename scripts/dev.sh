@@ -3,6 +3,7 @@
 #   scripts/dev.sh demo       the simulator's demo
 #   scripts/dev.sh test       the whole test suite
 #   scripts/dev.sh sanitize   the whole test suite under ASan and UBSan
+#   scripts/dev.sh bench      the benchmarks (a Release build of their own)
 # Missing Debian packages are installed with apt-get (as root) only when missing.
 set -euo pipefail
 cd "$(dirname "$0")/.."
@@ -11,6 +12,7 @@ packages=(g++ make cmake pkg-config libsqlite3-dev libboost-dev libgtest-dev lib
 
 install_missing_packages() {
   local missing=() p
+  packages+=("$@")
   for p in "${packages[@]}"; do
     dpkg-query -W -f='${Status}' "$p" 2>/dev/null | grep -q 'install ok installed' || missing+=("$p")
   done
@@ -54,8 +56,13 @@ case "${1:-}" in
     export UBSAN_OPTIONS=print_stacktrace=1:halt_on_error=1
     run_tests build-sanitize
     ;;
+  bench)
+    install_missing_packages libbenchmark-dev
+    build build-bench -DCMAKE_BUILD_TYPE=Release -DKORRIN_BENCHMARKS=ON -DKORRIN_TESTS=OFF
+    build-bench/bench/korrin-bench
+    ;;
   *)
-    echo "usage: scripts/dev.sh demo|test|sanitize" >&2
+    echo "usage: scripts/dev.sh demo|test|sanitize|bench" >&2
     exit 2
     ;;
 esac
