@@ -1,46 +1,81 @@
-// The simulated device as a whole: injected failures, call counts, what Reset
-// forgets and keeps, and the sample device.
+// The simulated device as a whole: the captured log, injected failures, call
+// and handle counts, what Reset forgets and keeps, and the sample device.
 #include <E_DBus.h>
 #include <app_manager.h>
 #include <app_preference.h>
 #include <bundle.h>
+#include <dlog.h>
 #include <mdm.h>
 #include <package_manager.h>
 #include <system_info.h>
+#include <unistd.h>
 
 #include <stdexcept>
 
+#include "common/log.h"
 #include "support/sim-test.h"
 
 namespace {
 
 class DeviceTest : public SimTest {
  protected:
-  int OpenRacer() {
+  static int Open(const char* appId) {
     app_info_h info = NULL;
-    int rc = app_info_create("com.ex.racer", &info);
+    int rc = app_info_create(appId, &info);
     if (rc == APP_MANAGER_ERROR_NONE) app_info_destroy(info);
     return rc;
   }
 };
 
-TEST_F(DeviceTest, FailNextFailsOneCallAfterTheSkippedOnes) {
-  device.AddGame("com.ex.racer", "Racer");
-  device.FailNext("app_info_create", APP_MANAGER_ERROR_IO_ERROR, 1);
-  EXPECT_EQ(APP_MANAGER_ERROR_NONE, OpenRacer());
-  EXPECT_EQ(APP_MANAGER_ERROR_IO_ERROR, OpenRacer());
-  EXPECT_EQ(APP_MANAGER_ERROR_NONE, OpenRacer());
-  EXPECT_EQ(3, device.CallCount("app_info_create"));
-  EXPECT_EQ(2, device.CallCount("app_info_destroy"));
+TEST_F(DeviceTest, LogCapturesEachLineAndEchoesItInReaderForm) {
+  dlog_print(DLOG_WARN, "tag-a", "plain %s %d", "text", 7);
+  device.EchoLogs(true);
+  testing::internal::CaptureStderr();
+  KLOG(DLOG_ERROR, "it's not the first launch");
+  const std::string line = std::to_string(__LINE__ - 1);
+  std::string printed = testing::internal::GetCapturedStderr();
+  device.EchoLogs(false);
+
+  const std::string text = "device_test.cpp: TestBody(" + line + ") >  it's not the first launch";
+  ASSERT_EQ(2u, device.Logs().size());
+  EXPECT_EQ(DLOG_WARN, device.Logs()[0].priority);
+  EXPECT_EQ("tag-a", device.Logs()[0].tag);
+  EXPECT_EQ("plain text 7", device.Logs()[0].text);
+  EXPECT_EQ(DLOG_ERROR, device.Logs()[1].priority);
+  EXPECT_EQ("korrin", device.Logs()[1].tag);
+  EXPECT_EQ(text, device.Logs()[1].text);
+  EXPECT_EQ("E/korrin(" + std::to_string(getpid()) + "): " + text + "\n", printed);
 }
 
-TEST_F(DeviceTest, FailAlwaysHoldsUntilCleared) {
+TEST_F(DeviceTest, InjectedFailuresHoldOnceAfterTheSkippedCallsOrAlways) {
   device.AddGame("com.ex.racer", "Racer");
+  device.FailNext("app_info_create", APP_MANAGER_ERROR_IO_ERROR, 1);
+  EXPECT_EQ(APP_MANAGER_ERROR_NONE, Open("com.ex.racer"));
+  EXPECT_EQ(APP_MANAGER_ERROR_IO_ERROR, Open("com.ex.racer"));
+  EXPECT_EQ(APP_MANAGER_ERROR_NONE, Open("com.ex.racer"));
+  EXPECT_EQ(3, device.CallCount("app_info_create"));
+  EXPECT_EQ(2, device.CallCount("app_info_destroy"));
+
   device.FailAlways("app_info_create", APP_MANAGER_ERROR_DB_FAILED);
-  EXPECT_EQ(APP_MANAGER_ERROR_DB_FAILED, OpenRacer());
-  EXPECT_EQ(APP_MANAGER_ERROR_DB_FAILED, OpenRacer());
+  EXPECT_EQ(APP_MANAGER_ERROR_DB_FAILED, Open("com.ex.racer"));
+  EXPECT_EQ(APP_MANAGER_ERROR_DB_FAILED, Open("com.ex.racer"));
   device.ClearFailures();
-  EXPECT_EQ(APP_MANAGER_ERROR_NONE, OpenRacer());
+  EXPECT_EQ(APP_MANAGER_ERROR_NONE, Open("com.ex.racer"));
+  EXPECT_EQ(0, HandlesOpenedByTest());
+}
+
+TEST_F(DeviceTest, HandlesCountUntilReleasedOnce) {
+  device.AddGame("com.ex.racer", "Racer");
+  app_info_h info = NULL;
+  ASSERT_EQ(APP_MANAGER_ERROR_NONE, app_info_create("com.ex.racer", &info));
+  bundle* b = bundle_create();
+  ASSERT_EQ(MDM_RESULT_SUCCESS, mdm_get_service());
+  EXPECT_EQ(3, HandlesOpenedByTest());
+  EXPECT_EQ(APP_MANAGER_ERROR_NONE, app_info_destroy(info));
+  EXPECT_EQ(APP_MANAGER_ERROR_INVALID_PARAMETER, app_info_destroy(info));
+  EXPECT_EQ(BUNDLE_ERROR_NONE, bundle_free(b));
+  EXPECT_EQ(MDM_RESULT_SUCCESS, mdm_release_service());
+  EXPECT_EQ(MDM_RESULT_FAIL, mdm_release_service());
   EXPECT_EQ(0, HandlesOpenedByTest());
 }
 
@@ -86,12 +121,7 @@ TEST_F(DeviceTest, ResetForgetsTheDeviceButKeepsHeldHandles) {
   EXPECT_EQ(1, device.PackageListeners());
   device.Install(sim::MakePackage("com.ex.new", {sim::GameApp("com.ex.new", "New")}));
   EXPECT_EQ(3, heard);
-  EXPECT_EQ(APP_MANAGER_ERROR_NONE, [] {
-    app_info_h info = NULL;
-    int rc = app_info_create("com.ex.new", &info);
-    app_info_destroy(info);
-    return rc;
-  }());
+  EXPECT_EQ(APP_MANAGER_ERROR_NONE, Open("com.ex.new"));
   EXPECT_EQ(PACKAGE_MANAGER_ERROR_NONE, package_manager_destroy(client));
 }
 

@@ -1,10 +1,7 @@
-// The simulated device's smaller services: preferences, bundles, the system
-// bus, the device-management service and the usage-log client.
+// The simulated device's preferences and system bus: where the storage-card
+// status and the boot signal reach the launcher.
 #include <E_DBus.h>
 #include <app_preference.h>
-#include <bundle.h>
-#include <mdm.h>
-#include <velmora_log_manager.h>
 
 #include "support/sim-test.h"
 
@@ -21,22 +18,6 @@ TEST_F(ServicesTest, PreferencesAnswerNoKeyUntilSet) {
   EXPECT_EQ(1, value);
   device.RemovePreference("memory/sysman/mmc");
   EXPECT_EQ(PREFERENCE_ERROR_NO_KEY, preference_get_int("memory/sysman/mmc", &value));
-}
-
-TEST_F(ServicesTest, BundleKeepsEachKeyOnce) {
-  bundle* b = bundle_create();
-  ASSERT_NE(nullptr, b);
-  EXPECT_EQ(BUNDLE_ERROR_NONE, bundle_add_str(b, "feature", "open"));
-  EXPECT_EQ(BUNDLE_ERROR_KEY_EXISTS, bundle_add_str(b, "feature", "close"));
-  EXPECT_EQ(-18350079, BUNDLE_ERROR_KEY_EXISTS);
-  char* value = NULL;
-  EXPECT_EQ(BUNDLE_ERROR_NONE, bundle_get_str(b, "feature", &value));
-  EXPECT_STREQ("open", value);
-  EXPECT_EQ(BUNDLE_ERROR_KEY_NOT_AVAILABLE, bundle_get_str(b, "extra", &value));
-  EXPECT_EQ(1, bundle_get_count(b));
-  EXPECT_EQ(1, HandlesOpenedByTest());
-  EXPECT_EQ(BUNDLE_ERROR_NONE, bundle_free(b));
-  EXPECT_EQ(0, HandlesOpenedByTest());
 }
 
 // ---- The system bus.
@@ -129,51 +110,6 @@ TEST_F(ServicesTest, ClosingAConnectionDropsItsSubscriptions) {
   EXPECT_EQ(0, HandlesOpenedByTest());
   EXPECT_EQ(0, device.SendBusSignal("/p", "i", "m"));
   e_dbus_shutdown();
-}
-
-// ---- Device management and usage logs.
-
-TEST_F(ServicesTest, PolicyServiceAnswersPerApplicationWhileConnected) {
-  EXPECT_EQ(MDM_STATUS_ERROR, mdm_get_application_state("com.ex.a"));  // not connected
-  device.SetMdm(true, {{"com.ex.b", MDM_RESTRICTED}});
-  ASSERT_EQ(MDM_RESULT_SUCCESS, mdm_get_service());
-  EXPECT_EQ(1, HandlesOpenedByTest());
-  EXPECT_EQ(MDM_ALLOWED, mdm_get_application_state("com.ex.a"));
-  EXPECT_EQ(MDM_RESTRICTED, mdm_get_application_state("com.ex.b"));
-  EXPECT_EQ(MDM_RESULT_SUCCESS, mdm_release_service());
-  EXPECT_EQ(0, HandlesOpenedByTest());
-
-  device.SetMdm(false);
-  EXPECT_NE(MDM_RESULT_SUCCESS, mdm_get_service());
-  EXPECT_EQ(0, HandlesOpenedByTest());
-}
-
-TEST_F(ServicesTest, UsageLogClientRecordsEachBundleWithItsProvider) {
-  velmora_log_manager_h logs = NULL;
-  ASSERT_EQ(VELMORA_LOG_MANAGER_ERROR_NONE, velmora_log_manager_create(&logs));
-  bundle* b = bundle_create();
-  bundle_add_str(b, "feature", "open");
-  bundle_add_str(b, "app_id", "com.ex.a");
-  int requestId = 0;
-  int answered = 0;
-  EXPECT_EQ(VELMORA_LOG_MANAGER_ERROR_NONE,
-            velmora_log_manager_insert(
-                logs, "content://p/log/x", b,
-                [](int result, int id, void* data) { *static_cast<int*>(data) = id + result; },
-                &answered, &requestId));
-  EXPECT_EQ(1, requestId);
-  EXPECT_EQ(1, answered);
-  bundle_free(b);
-  EXPECT_EQ(VELMORA_LOG_MANAGER_ERROR_INVALID_PARAMETER,
-            velmora_log_manager_insert(logs, "content://p/log/x", b, NULL, NULL, NULL));
-  velmora_log_manager_destroy(logs);
-
-  ASSERT_EQ(1u, device.UsageLogs().size());
-  EXPECT_EQ("content://p/log/x", device.UsageLogs()[0].provider);
-  EXPECT_EQ((std::vector<std::pair<std::string, std::string>>{{"feature", "open"},
-                                                              {"app_id", "com.ex.a"}}),
-            device.UsageLogs()[0].fields);
-  EXPECT_EQ(0, HandlesOpenedByTest());
 }
 
 }  // namespace
