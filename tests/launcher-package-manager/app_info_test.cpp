@@ -3,6 +3,8 @@
 #include <app_manager.h>
 #include <package_manager.h>
 
+#include <functional>
+
 #include "package-manager-test.h"
 
 namespace {
@@ -49,49 +51,46 @@ TEST_F(AppInfoTest, ReadingFillsTheRecordAndCachesThatVeryRecord) {
   EXPECT_EQ(0, LeftOpen());
 }
 
-TEST_F(AppInfoTest, MissingOrEmptyIconGetsTheDefault) {
+TEST_F(AppInfoTest, WhatTheDeviceReportsShapesTheRecord) {
+  const std::string icon = "/opt/usr/share/icons/default/small/com.ex.racer.png";
   struct {
-    std::optional<std::string> icon;
-    std::string expected;
+    const char* name;
+    std::function<void(sim::App&)> change;
+    bool read;
+    std::string appName;  // the record held "Kept"
+    std::string iconPath;
+    bool enabled;
+    std::string log;  // the last line
   } cases[] = {
-      {std::nullopt, DefaultIcon()},
-      {std::string(""), DefaultIcon()},
-      {std::string("/icons/racer.png"), "/icons/racer.png"},
+      {"no icon", [](sim::App& a) { a.icon.reset(); }, true, "Racer", DefaultIcon(), true,
+       "E Name[Racer] enable[1] system[0]"},
+      {"empty icon", [](sim::App& a) { a.icon = ""; }, true, "Racer", DefaultIcon(), true,
+       "E Name[Racer] enable[1] system[0]"},
+      {"null label: the name stays", [](sim::App& a) { a.label.reset(); }, true, "Kept", icon,
+       true, "E Name[(null)] enable[1] system[0]"},
+      {"disabled", [](sim::App& a) { a.enabled = false; }, true, "Racer", icon, false,
+       "E Name[Racer] enable[0] system[0]"},
+      {"no display: refused untouched", [](sim::App& a) { a.noDisplay = true; }, false, "Kept",
+       "", false, "E app[com.ex.racer] is nodisplay app"},
   };
   for (const auto& c : cases) {
-    device.FindApp("com.ex.racer")->icon = c.icon;
+    SCOPED_TRACE(c.name);
+    sim::App app = sim::GameApp("com.ex.racer", "Racer");
+    c.change(app);
+    device.AddPackage(sim::MakePackage("com.ex.racer", {app}));
+    device.ClearLogs();
+    manager.m_appInfoCache.clear();
     boost::shared_ptr<GameBoxData> box = NewBox();
-    ASSERT_TRUE(manager._GetAppInfo("com.ex.racer", box));
-    EXPECT_EQ(c.expected, box->iconPath);
+    box->name = "Kept";
+    EXPECT_EQ(c.read, manager._GetAppInfo("com.ex.racer", box));
+    EXPECT_EQ(c.appName, box->name);
+    EXPECT_EQ(c.iconPath, box->iconPath);
+    EXPECT_EQ(c.enabled, box->isEnabled);
+    EXPECT_EQ(c.read ? "com.ex.racer" : "", box->appId);
+    EXPECT_EQ(c.read ? 1u : 0u, manager.m_appInfoCache.size());
+    EXPECT_EQ(c.log, EngineMessages().back());
+    EXPECT_EQ(0, LeftOpen());
   }
-}
-
-TEST_F(AppInfoTest, NullLabelLeavesTheNameAsItWas) {
-  device.FindApp("com.ex.racer")->label.reset();
-  boost::shared_ptr<GameBoxData> box = NewBox();
-  box->name = "Kept";
-  ASSERT_TRUE(manager._GetAppInfo("com.ex.racer", box));
-  EXPECT_EQ("Kept", box->name);
-  EXPECT_EQ("E Name[(null)] enable[1] system[0]", EngineMessages().back());
-}
-
-TEST_F(AppInfoTest, DisabledApplicationIsReadAsNotEnabled) {
-  device.FindApp("com.ex.racer")->enabled = false;
-  boost::shared_ptr<GameBoxData> box = NewBox();
-  ASSERT_TRUE(manager._GetAppInfo("com.ex.racer", box));
-  EXPECT_FALSE(box->isEnabled);
-  EXPECT_EQ("E Name[Racer] enable[0] system[0]", EngineMessages().back());
-}
-
-TEST_F(AppInfoTest, NoDisplayApplicationIsRefusedUntouched) {
-  device.FindApp("com.ex.racer")->noDisplay = true;
-  boost::shared_ptr<GameBoxData> box = NewBox();
-  EXPECT_FALSE(manager._GetAppInfo("com.ex.racer", box));
-  EXPECT_EQ("", box->appId);
-  EXPECT_EQ("", box->name);
-  EXPECT_TRUE(manager.m_appInfoCache.empty());
-  EXPECT_EQ((std::vector<std::string>{"E app[com.ex.racer] is nodisplay app"}), EngineMessages());
-  EXPECT_EQ(0, LeftOpen());
 }
 
 // ---- Failure paths: one platform call fails; nothing is filled, nothing
@@ -198,12 +197,8 @@ TEST_F(AppInfoTest, EntryWithoutNameOrIconIsDroppedAndReadAfresh) {
     EXPECT_EQ(second.get(), manager.m_appInfoCache["com.ex.racer"].get());
     EXPECT_EQ("Racer", second->name);
   }
-}
-
-TEST_F(AppInfoTest, FailedRereadLeavesNoEntry) {
-  boost::shared_ptr<GameBoxData> first = NewBox();
-  ASSERT_TRUE(manager.GetAppInfo("com.ex.racer", first));
-  first->name = "";
+  // A failed re-read leaves no entry behind.
+  manager.m_appInfoCache["com.ex.racer"]->name = "";
   device.FailNext("app_info_create", APP_MANAGER_ERROR_IO_ERROR);
   EXPECT_FALSE(manager.GetAppInfo("com.ex.racer", NewBox()));
   EXPECT_TRUE(manager.m_appInfoCache.empty());

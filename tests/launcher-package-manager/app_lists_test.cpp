@@ -103,16 +103,6 @@ TEST_F(AppListsTest, ListingFailuresReturnFalseAndKeepTheCallersList) {
   }
 }
 
-TEST_F(AppListsTest, ListingCallbackRefusesNullArguments) {
-  device.AddGame("com.ex.apple", "Apple");
-  app_info_h info = NULL;
-  ASSERT_EQ(APP_MANAGER_ERROR_NONE, app_info_create("com.ex.apple", &info));
-  EXPECT_FALSE(LauncherPackageManager::_GetAllAppsInfoCb(NULL, &manager));
-  EXPECT_FALSE(LauncherPackageManager::_GetAllAppsInfoCb(info, NULL));
-  app_info_destroy(info);
-  EXPECT_EQ((Ids{"E (NULL == handle)", "E (NULL == user_data)"}), EngineMessages());
-}
-
 // ---- _GetAppIds
 
 TEST_F(AppListsTest, PackageListsItsDisplayableUiGames) {
@@ -253,7 +243,14 @@ TEST_F(AppListsTest, MenuLaunchFailuresAnswerFalse) {
   EXPECT_TRUE(manager._IsMenuLaunch("com.ex.racer"));
 }
 
-TEST_F(AppListsTest, MenuLaunchCallbacksStopAtOnceAndGuardTheirArguments) {
+TEST_F(AppListsTest, CallbacksGuardTheirArgumentsAndTheMetadataWalkStopsAtOnce) {
+  device.AddGame("com.ex.apple", "Apple");
+  app_info_h info = NULL;
+  ASSERT_EQ(APP_MANAGER_ERROR_NONE, app_info_create("com.ex.apple", &info));
+  EXPECT_FALSE(LauncherPackageManager::_GetAllAppsInfoCb(NULL, &manager));
+  EXPECT_FALSE(LauncherPackageManager::_GetAllAppsInfoCb(info, NULL));
+  app_info_destroy(info);
+
   bool found = false;
   const char* key = "http://velmora.com/tizen/metadata/menu/launch/operation";
   EXPECT_FALSE(
@@ -265,7 +262,9 @@ TEST_F(AppListsTest, MenuLaunchCallbacksStopAtOnceAndGuardTheirArguments) {
   EXPECT_TRUE(found);
   EXPECT_FALSE(LauncherPackageManager::_app_metadata_list_cb(key, "x", NULL));
   EXPECT_FALSE(LauncherPackageManager::_has_mini_app_cb(NULL, &found));
-  EXPECT_EQ((Ids{"E (NULL == user_data)", "E (NULL == handle)"}), EngineMessages());
+  EXPECT_EQ((Ids{"E (NULL == handle)", "E (NULL == user_data)", "E (NULL == user_data)",
+                 "E (NULL == handle)"}),
+            EngineMessages());
 }
 
 }  // namespace

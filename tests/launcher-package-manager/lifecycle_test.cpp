@@ -13,7 +13,7 @@ typedef std::vector<std::string> Ids;
 
 class LifecycleTest : public PackageManagerTest {};
 
-TEST_F(LifecycleTest, ConstructionCreatesTheClientAndDestructionReleasesIt) {
+TEST_F(LifecycleTest, ClientLivesFromConstructionUntilTerminate) {
   EXPECT_NE(nullptr, manager.m_pkgMgr);
   EXPECT_EQ(1, HandlesOpenedByTest());
   EXPECT_EQ(0, device.PackageListeners());  // nothing registered before Initialize
@@ -22,6 +22,12 @@ TEST_F(LifecycleTest, ConstructionCreatesTheClientAndDestructionReleasesIt) {
     EXPECT_EQ(2, HandlesOpenedByTest());
   }
   EXPECT_EQ(1, HandlesOpenedByTest());
+
+  EXPECT_TRUE(manager.Terminate());
+  EXPECT_EQ(nullptr, manager.m_pkgMgr);
+  EXPECT_EQ(0, HandlesOpenedByTest());
+  EXPECT_TRUE(manager.Terminate());
+  EXPECT_EQ(2, device.CallCount("package_manager_destroy"));  // another's, and one here
   EXPECT_TRUE(EngineMessages().empty());
 }
 
@@ -34,14 +40,6 @@ TEST_F(LifecycleTest, FailedClientCreationIsSilent) {
   EXPECT_EQ(nullptr, without.m_bootSignalHandler);
   EXPECT_TRUE(without.Terminate());
   EXPECT_TRUE(EngineMessages().empty());
-}
-
-TEST_F(LifecycleTest, TerminateReleasesTheClientOnce) {
-  EXPECT_TRUE(manager.Terminate());
-  EXPECT_EQ(nullptr, manager.m_pkgMgr);
-  EXPECT_EQ(0, HandlesOpenedByTest());
-  EXPECT_TRUE(manager.Terminate());
-  EXPECT_EQ(1, device.CallCount("package_manager_destroy"));
 }
 
 TEST_F(LifecycleTest, TerminateKeepsTheClientWhenReleaseFails) {
@@ -62,24 +60,6 @@ TEST_F(LifecycleTest, TerminateKeepsTheClientWhenReleaseFails) {
     EXPECT_EQ("Terminate", EngineLogs()[0].function);
   }
   EXPECT_EQ(1, HandlesOpenedByTest());  // each destructor tried again, and succeeded
-}
-
-TEST_F(LifecycleTest, EveryOperationGivesItsHandlesBack) {
-  device.LoadSampleDevice();
-  Ids ids;
-  manager.GetAppIdList(ids);
-  ASSERT_FALSE(ids.empty());
-  manager.GetAppInfo(ids[0], NewBox());
-  manager.GetAppName(ids[0], NewBox());
-  manager._GetAppIds("com.starwick.tilepack");
-  manager._IsMenuLaunch("com.glowmark.runeledger");
-  manager._IsMenuLaunch("com.velmora.calculator");
-  Ids deactivated = manager._GetDeactivatedAppIds();
-  ASSERT_EQ(Ids{"com.frostpath.turbotortoise"}, deactivated);
-  manager._GetDeactivatedAppInfo(deactivated[0], NewBox());
-  manager.IsMDMAllowed(ids[0]);
-  manager.Terminate();
-  EXPECT_EQ(0, HandlesOpenedByTest()) << testing::PrintToString(device.OpenHandlesByKind());
 }
 
 // ---- Device-management policy.
