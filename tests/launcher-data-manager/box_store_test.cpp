@@ -63,79 +63,56 @@ TEST_F(BoxStoreTest, InsertUsesTheFormOfTheBox) {
   }
 }
 
-TEST_F(BoxStoreTest, DefaultBoxIsStoredAsAnEmptyApplicationBox) {
-  GameBoxData box;
-  int id = store.InsertBoxData(box);
-  EXPECT_EQ((Row{"0", "NULL", "0", "NULL", "NULL", "0", "0", "0", "0", "0", "0", "NULL", "NULL"}),
-            Stored(id));
+TEST_F(BoxStoreTest, EmptyTextsAreStoredAsNullInEveryForm) {
+  const bool isFolder[] = {true, false, false};
+  const int boxType[] = {0, 3, 0};
+  for (int form = 0; form < 3; ++form) {
+    GameBoxData box;
+    box.isFolder = isFolder[form];
+    box.boxType = boxType[form];
+    box.pageId = page;
+    int id = store.InsertBoxData(box);
+    EXPECT_EQ("NULL|NULL|NULL|NULL",
+              db->Value("SELECT quote(appId) || '|' || quote(name) || '|' || quote(iconPath) || "
+                        "'|' || quote(content) FROM Boxes WHERE boxId = " + std::to_string(id)))
+        << form;
+    EXPECT_EQ("", store.GetMenuBoxData(id)->name);
+  }
 }
 
-TEST_F(BoxStoreTest, EmptyTextsAreStoredAsNull) {
-  GameBoxData folder = Box(true, 0);
-  folder.name = "";
-  folder.appId = "";
-  int id = store.InsertBoxData(folder);
-  EXPECT_EQ("NULL|NULL", db->Value("SELECT quote(name) || '|' || quote(appId) FROM Boxes"));
-  EXPECT_EQ("", store.GetMenuBoxData(id)->name);
-}
-
-TEST_F(BoxStoreTest, UpdateOfAFolderStoresIsSystemZero) {
-  GameBoxData box = Box(true, 0);
-  int id = store.InsertBoxData(box);
-  box.name = "Puzzles";
-  box.col = 4;
-  EXPECT_TRUE(store.UpdateBoxData(box));
-  Row stored = Stored(id);
-  EXPECT_EQ("Puzzles", stored[4]);
-  EXPECT_EQ("4", stored[5]);
-  EXPECT_EQ("0", stored[8]);  // isSystem
-}
-
-TEST_F(BoxStoreTest, UpdateOfAnApplicationBoxKeepsIconAndContent) {
-  GameBoxData shortcut = Box(false, 3);
-  int id = store.InsertBoxData(shortcut);
-  GameBoxData box = Box(false, 0);
-  box.boxId = id;
-  box.name = "";
-  box.iconPath = "/elsewhere.png";
-  box.content = "changed";
-  EXPECT_TRUE(store.UpdateBoxData(box));
-  EXPECT_EQ((Row{"0", "NULL", std::to_string(page), "com.ex.racer", "NULL", "2", "3", "1", "1",
-                 "0", "5", "/icons/racer.png", "race://start"}),
-            Stored(id));
-}
-
-TEST_F(BoxStoreTest, UpdateOfAShortcutWritesEveryText) {
-  GameBoxData empty;
-  int id = store.InsertBoxData(empty);
-  int other = AddPage(1, 2);
-  GameBoxData box = Box(false, 3);
-  box.boxId = id;
-  box.pageId = other;
-  box.content = "";
-  EXPECT_TRUE(store.UpdateBoxData(box));
-  EXPECT_EQ((Row{"0", "NULL", std::to_string(other), "com.ex.racer", "Racer", "2", "3", "1", "1",
-                 "3", "5", "/icons/racer.png", "NULL"}),
-            Stored(id));
-}
-
-TEST_F(BoxStoreTest, UpdateTurnsABoxIntoAFolderAndBack) {
-  GameBoxData box = Box(false, 0);
-  int id = store.InsertBoxData(box);
-  box.isFolder = true;
-  store.UpdateBoxData(box);
-  EXPECT_EQ("1", Stored(id)[0]);
-  box.isFolder = false;
-  store.UpdateBoxData(box);
-  EXPECT_EQ("0", Stored(id)[0]);
-  EXPECT_EQ(id, box.boxId);
-}
-
-TEST_F(BoxStoreTest, UpdateOfAMissingBoxIsStillTrue) {
-  GameBoxData box = Box(false, 0);
-  box.boxId = 404;
-  EXPECT_TRUE(store.UpdateBoxData(box));
-  EXPECT_EQ("0", db->Value("SELECT count(*) FROM Boxes"));
+TEST_F(BoxStoreTest, UpdateUsesTheFormOfTheBox) {
+  const std::string other = std::to_string(AddPage(1, 2));
+  struct Case {
+    const char* what;
+    bool isFolder;
+    int boxType;
+    std::string name;
+    Row stored;
+  } cases[] = {
+      {"folder: never a system box; appId, icon and content left alone", true, 0, "Puzzles",
+       {"1", "NULL", other, "com.ex.racer", "Puzzles", "4", "3", "1", "0", "0", "5",
+        "/icons/racer.png", "race://start"}},
+      {"application: icon and content left alone", false, 0, "",
+       {"0", "NULL", other, "com.ex.new", "NULL", "4", "3", "1", "1", "0", "5", "/icons/racer.png",
+        "race://start"}},
+      {"shortcut: every text", false, 3, "New",
+       {"0", "NULL", other, "com.ex.new", "New", "4", "3", "1", "1", "3", "5", "/elsewhere.png",
+        "NULL"}},
+  };
+  for (const Case& c : cases) {
+    GameBoxData shortcut = Box(false, 3);
+    int id = store.InsertBoxData(shortcut);
+    GameBoxData box = Box(c.isFolder, c.boxType);
+    box.boxId = id;
+    box.pageId = std::stoi(other);
+    box.col = 4;
+    box.appId = "com.ex.new";
+    box.name = c.name;
+    box.iconPath = "/elsewhere.png";
+    box.content = "";
+    EXPECT_TRUE(store.UpdateBoxData(box)) << c.what;
+    EXPECT_EQ(c.stored, Stored(id)) << c.what;
+  }
 }
 
 TEST_F(BoxStoreTest, GetMenuBoxDataReadsEveryStoredMember) {
@@ -200,18 +177,29 @@ TEST_F(BoxStoreTest, GetBoxIdByAppIdWritesOwnerPageAndBox) {
   EXPECT_EQ(31, parentId);
   EXPECT_EQ(folderPage, pageId);
   EXPECT_EQ(id, boxId);
+
+  // An empty id is looked up as given: it finds '', never NULL.
+  int empty = AddBox(page, "", 1, 1);
+  AddBoxSql("isFolder, pageId", "0, " + std::to_string(page));
+  EXPECT_TRUE(store.GetBoxIdByAppId("", &parentId, &pageId, &boxId));
+  EXPECT_EQ(empty, boxId);
+  EXPECT_EQ(empty, store.GetBoxDataByAppId("")->boxId);
 }
 
-TEST_F(BoxStoreTest, LookUpsNeverFindAShortcut) {
+TEST_F(BoxStoreTest, LookUpsNeverFindAShortcutAndLogTheMiss) {
   GameBoxData shortcut = Box(false, 3);
-  shortcut.appId = "a";
   store.InsertBoxData(shortcut);
   int parentId = -1, pageId = -2, boxId = -3;
-  EXPECT_FALSE(store.GetBoxIdByAppId("a", &parentId, &pageId, &boxId));
+  EXPECT_FALSE(store.GetBoxIdByAppId("com.ex.racer", &parentId, &pageId, &boxId));
   EXPECT_EQ(-1, parentId);
   EXPECT_EQ(-2, pageId);
   EXPECT_EQ(-3, boxId);
-  EXPECT_EQ(0, store.GetBoxDataByAppId("a")->boxId);
+  boost::shared_ptr<GameBoxData> read = store.GetBoxDataByAppId("com.ex.racer");
+  ASSERT_TRUE(read);
+  EXPECT_EQ(0, read->boxId);
+  EXPECT_EQ((std::vector<EngineLog>{{DLOG_ERROR, "launcher-data-manager.cpp", "GetBoxDataByAppId",
+                                     "cannot find box with appid[com.ex.racer]"}}),
+            EngineLogs());
 }
 
 TEST_F(BoxStoreTest, GetBoxDataByAppIdReadsPlacementAndFlagsOnly) {
@@ -229,25 +217,6 @@ TEST_F(BoxStoreTest, GetBoxDataByAppIdReadsPlacementAndFlagsOnly) {
   EXPECT_TRUE(read->isSystem);
   EXPECT_EQ(0, read->launchType);  // not read by this look-up
   EXPECT_TRUE(EngineLogs().empty());
-}
-
-TEST_F(BoxStoreTest, GetBoxDataByAppIdLogsAnUnknownId) {
-  AddBox(page, "", 1, 1);
-  boost::shared_ptr<GameBoxData> read = store.GetBoxDataByAppId("com.ex.none");
-  ASSERT_TRUE(read);
-  EXPECT_EQ(0, read->boxId);
-  EXPECT_EQ((std::vector<EngineLog>{{DLOG_ERROR, "launcher-data-manager.cpp", "GetBoxDataByAppId",
-                                     "cannot find box with appid[com.ex.none]"}}),
-            EngineLogs());
-}
-
-TEST_F(BoxStoreTest, EmptyAppIdIsLookedUpAsGiven) {
-  int id = AddBox(page, "", 1, 1);
-  AddBoxSql("isFolder, pageId", "0, " + std::to_string(page));  // NULL appId: never matches
-  int parentId = 0, pageId = 0, boxId = 0;
-  EXPECT_TRUE(store.GetBoxIdByAppId("", &parentId, &pageId, &boxId));
-  EXPECT_EQ(id, boxId);
-  EXPECT_EQ(id, store.GetBoxDataByAppId("")->boxId);
 }
 
 // ---- Failures
