@@ -111,20 +111,6 @@ TEST_F(ListingsTest, DownloadViewListsAppBoxesInInsertOrderOnFourColumns) {
             Cells(boxes));
 }
 
-TEST_F(ListingsTest, DownloadViewLeavesOutFoldersPreloadedAndShortcuts) {
-  int page = AddPage(1, 1);
-  AddBoxSql("isFolder, pageId, appId, isPreload, boxType",
-            "1, " + std::to_string(page) + ", 'folder', 0, 0");
-  AddBoxSql("isFolder, pageId, appId, isPreload, boxType",
-            "0, " + std::to_string(page) + ", 'preloaded', 1, 0");
-  AddBoxSql("isFolder, pageId, appId, isPreload, boxType",
-            "0, " + std::to_string(page) + ", 'shortcut', 0, 3");
-  AddBox(page, "kept", 1, 1);
-  std::vector<boost::shared_ptr<GameBoxData> > boxes = store.GetBoxDataListByDownload(1, false);
-  ASSERT_EQ(1u, boxes.size());
-  EXPECT_EQ("kept", boxes[0]->appId);
-}
-
 TEST_F(ListingsTest, DownloadViewOpensTheNextVirtualPageAfterTheLastRow) {
   store.m_maxRows = 2;  // a small page, so that eight boxes fill it
   int page = AddPage(1, 1);

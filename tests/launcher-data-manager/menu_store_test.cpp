@@ -34,15 +34,6 @@ TEST_F(MenuStoreTest, EmptyNameIsStoredAsNullAndReadsBackEmpty) {
   EXPECT_EQ(-1, read->type);
 }
 
-TEST_F(MenuStoreTest, GetMenuDataOfMissingIdIsTheDefaultRecord) {
-  AddMenu("Apps");
-  boost::shared_ptr<GameViewData> menu = store.GetMenuData(42);
-  ASSERT_TRUE(menu);
-  EXPECT_EQ(0, menu->menuId);
-  EXPECT_EQ("", menu->name);
-  EXPECT_EQ(-1, menu->type);
-}
-
 TEST_F(MenuStoreTest, UpdateRewritesNameAndTypeByIdFoundOrNot) {
   int id = AddMenu("Apps");
   GameViewData menu;

@@ -1,4 +1,4 @@
-// Pages: single-page operations and counts.
+// Pages: single-page operations.
 #include "launcher-data-manager/store-test.h"
 
 namespace {
@@ -66,31 +66,6 @@ TEST_F(PageStoreTest, DeleteFolderPagesTakesEveryPageOfThatParentId) {
   AddPage(6, 1, true);
   EXPECT_TRUE(store.DeleteFolderPageData(5));
   EXPECT_EQ((std::vector<Row>{{"6"}}), db->Rows("SELECT parentId FROM Pages"));
-}
-
-TEST_F(PageStoreTest, PageCountAlwaysAnswersZero) {
-  AddPage(1, 1);
-  AddPage(1, 2);
-  EXPECT_EQ(0, store.GetPageDataCount(1, false));
-  EXPECT_EQ(0, store.GetPageDataCount(1, true));
-  EXPECT_TRUE(EngineLogs().empty());
-}
-
-TEST_F(PageStoreTest, DownloadCountTakesUnpreloadedAppBoxesOnExistingPages) {
-  int page = AddPage(1, 1);
-  int folderPage = AddPage(40, 1, true);
-  AddBox(page, "a", 1, 1);
-  AddBox(folderPage, "b", 1, 1);
-  AddBoxSql("isFolder, pageId, appId, isPreload, boxType",
-            "0, " + std::to_string(page) + ", 'shortcut', 0, 3");
-  AddBoxSql("isFolder, pageId, isPreload, boxType", "1, " + std::to_string(page) + ", 0, 0");
-  AddBoxSql("isFolder, pageId, appId, isPreload, boxType",
-            "0, " + std::to_string(page) + ", 'pre', 1, 0");
-  AddBox(999, "orphan", 1, 1);  // its page does not exist
-
-  // a, b and the shortcut count; the folder, the preloaded box and the orphan do not.
-  EXPECT_EQ(3, store._GetPageDataCountByDownload(1));
-  EXPECT_EQ(3, store._GetPageDataCountByDownload(-8));
 }
 
 TEST_F(PageStoreTest, AlphabeticalFormsAnswerFixedValuesAndTouchNothing) {

@@ -115,10 +115,13 @@ TEST_F(SqlTextTest, EachOperationRunsItsOwnText) {
   }
 }
 
-TEST_F(SqlTextTest, PageCountComposesATextThatNeverCompiles) {
+TEST_F(SqlTextTest, PageCountComposesATextThatNeverCompilesAndAnswersZero) {
+  AddPage(1, 1);
   // Not traced, since it never runs; what it would run cannot compile.
-  store.GetPageDataCount(1, false);
+  EXPECT_EQ(0, store.GetPageDataCount(1, false));
+  EXPECT_EQ(0, store.GetPageDataCount(1, true));
   EXPECT_TRUE(TakeStatements().empty());
+  EXPECT_TRUE(EngineLogs().empty());
   EXPECT_NE(SQLITE_OK, db->TryExec("SELECT COUNT(*) FROM pages WHERE isFolder 0 AND menuId = 1"));
 }
 
