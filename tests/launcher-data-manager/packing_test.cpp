@@ -207,18 +207,6 @@ TEST_F(PackingTest, RearrangeRunsInOneTransactionAndASecondPassChangesNothing) {
   EXPECT_EQ(once, Dump());
 }
 
-TEST_F(PackingTest, RearrangeWithoutMenusOnlyOpensAndCommits) {
-  store.RearrangeAppsPosition();
-  EXPECT_EQ((std::vector<std::string>{"BEGIN IMMEDIATE TRANSACTION",
-                                      "SELECT menuId, name, type FROM menus ORDER BY menuId DESC",
-                                      "COMMIT TRANSACTION"}),
-            TakeStatements());
-}
-
-}  // namespace
-
-namespace {
-
 TEST_F(PackingTest, ATenThousandBoxLayoutRearrangesAndListsAlphabetically) {
   int apps = AddMenu("Apps");
   int page = AddPage(apps, 1);

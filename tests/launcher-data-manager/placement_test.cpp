@@ -28,7 +28,7 @@ TEST_F(PlacementTest, FirstAppOfAnEmptyMenuOpensPageOne) {
                      "boxType, launchType, iconPath, content FROM Boxes"));
 }
 
-TEST_F(PlacementTest, NextAppFollowsTheLastBoxAndWrapsAtFourColumns) {
+TEST_F(PlacementTest, NextAppFollowsTheLastBoxPastTheHolesAndWrapsAtFourColumns) {
   int page = AddPage(apps, 1);
   AddBox(page, "a", 1, 1);
   AddBox(page, "b", 3, 7);
@@ -45,15 +45,6 @@ TEST_F(PlacementTest, NextAppFollowsTheLastBoxAndWrapsAtFourColumns) {
     EXPECT_EQ(c.place, PlaceOf(c.appId));
   }
   EXPECT_EQ("1", db->Value("SELECT count(*) FROM Pages"));
-}
-
-TEST_F(PlacementTest, NewAppNeverFillsAHole) {
-  int page = AddPage(apps, 1);
-  AddBox(page, "a", 1, 1);
-  AddBox(page, "c", 3, 1);
-  bool pageAdded = false;
-  store.InsertBoxData("d", pageAdded);
-  EXPECT_EQ("1:4,1", PlaceOf("d"));
 }
 
 TEST_F(PlacementTest, TheLastPageIsTheOneNumberedHighest) {
