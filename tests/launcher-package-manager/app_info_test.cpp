@@ -98,10 +98,9 @@ TEST_F(AppInfoTest, WhatTheDeviceReportsShapesTheRecord) {
 
 TEST_F(AppInfoTest, EveryFailingCallIsLoggedAndReportedAsFalse) {
   const std::string type =
-      "E  app_info_get_type appid[com.ex.racer] pkg_id[com.ex.racer] "
-      "pkg_type[capp]";
+      "E  app_info_get_type appid[com.ex.racer] pkg_id[com.ex.racer] pkg_type[capp]";
   const std::string failed = "E AppId[com.ex.racer] failed to get pkginfo";
-  const int io = APP_MANAGER_ERROR_IO_ERROR;
+  const int io = TIZEN_ERROR_IO_ERROR;  // the same -5 for both managers
   const int db = APP_MANAGER_ERROR_DB_FAILED;
   struct {
     const char* call;
@@ -109,8 +108,7 @@ TEST_F(AppInfoTest, EveryFailingCallIsLoggedAndReportedAsFalse) {
     std::vector<std::string> logs;
   } cases[] = {
       {"app_info_create", db, {"E app_info_create return [-17891325]"}},
-      {"app_info_get_app_id",
-       io,
+      {"app_info_get_app_id", io,
        {"E app_info_get_app_id return [-5]", "E AppId[(null)] failed to get pkginfo"}},
       {"app_info_is_nodisplay", io, {"E app_info_is_nodisplay return [-5]", failed}},
       {"app_info_get_package", io, {"E app_info_get_package return [-5]", failed}},
@@ -121,17 +119,13 @@ TEST_F(AppInfoTest, EveryFailingCallIsLoggedAndReportedAsFalse) {
       {"app_info_get_type", io, {"E app_info_get_type return [-5]", failed}},
       // The package information is opened with package_info_create, though the
       // text names the package manager's call.
-      {"package_info_create",
-       PACKAGE_MANAGER_ERROR_NO_SUCH_PACKAGE,
+      {"package_info_create", PACKAGE_MANAGER_ERROR_NO_SUCH_PACKAGE,
        {type, "E package_manager_get_package_info return [-18153359]", failed}},
-      {"package_info_is_system_package",
-       PACKAGE_MANAGER_ERROR_IO_ERROR,
+      {"package_info_is_system_package", io,
        {type, "E package_info_is_system_package return [-5]", failed}},
-      {"package_info_is_removable_package",
-       PACKAGE_MANAGER_ERROR_IO_ERROR,
+      {"package_info_is_removable_package", io,
        {type, "E package_info_is_removable_package return [-5]", failed}},
-      {"package_info_is_preload_package",
-       PACKAGE_MANAGER_ERROR_IO_ERROR,
+      {"package_info_is_preload_package", io,
        {type, "E package_info_is_preload_package return [-5]", failed}},
   };
   for (const auto& c : cases) {

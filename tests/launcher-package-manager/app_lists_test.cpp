@@ -131,48 +131,26 @@ TEST_F(AppListsTest, FirstApplicationThatIsNoGameEndsThePackagesList) {
 
 TEST_F(AppListsTest, PackageListingFailures) {
   const char* retry = "E package_info_foreach_app_from_package != PACKAGE_MANAGER_ERROR_NONE";
-  const char* gaveUp =
-      "E try again package_info_foreach_app_from_package != PACKAGE_MANAGER_ERROR_NONE";
+  const char* appA = "E App [com.ex.pack.a], [0] [1]";
   struct {
     const char* name;
     const char* call;
     int times;  // failing calls in a row
     Ids appIds;
-    Ids logs;
+    Ids logs;  // between BEGIN and END
   } cases[] = {
-      {"no package information",
-       "package_manager_get_package_info",
-       1,
-       {},
-       {"E BEGIN", "E package_manager_get_package_info[com.ex.pack] != PACKAGE_MANAGER_ERROR_NONE",
-        "E END"}},
-      {"UI listing fails, all components listed instead",
-       "package_info_foreach_app_from_package",
-       1,
-       {"com.ex.pack.a"},
-       {"E BEGIN", retry, "E App [com.ex.pack.a], [0] [1]", "E ##### [com.ex.pack.a]",
-        "E App [com.ex.pack.sync], [0] [0]", "E ##### [com.ex.pack.a]", "E END"}},
-      {"both listings fail",
-       "package_info_foreach_app_from_package",
-       2,
-       {},
-       {"E BEGIN", retry, gaveUp, "E END"}},
-      {"application cannot be opened", "app_info_create", 1, {}, {"E BEGIN", "E END"}},
-      {"game test fails",
-       "app_info_is_game",
-       1,
-       {},
-       {"E BEGIN", "E App [com.ex.pack.a], [-5] [1]", "E END"}},
-      {"no-display read fails",
-       "app_info_is_nodisplay",
-       1,
-       {},
-       {"E BEGIN", "E App [com.ex.pack.a], [0] [1]", "E END"}},
-      {"id read fails",
-       "app_info_get_app_id",
-       1,
-       {},
-       {"E BEGIN", "E App [com.ex.pack.a], [0] [1]", "E END"}},
+      {"no package information", "package_manager_get_package_info", 1, {},
+       {"E package_manager_get_package_info[com.ex.pack] != PACKAGE_MANAGER_ERROR_NONE"}},
+      {"UI listing fails, all components listed instead", "package_info_foreach_app_from_package",
+       1, {"com.ex.pack.a"},
+       {retry, appA, "E ##### [com.ex.pack.a]", "E App [com.ex.pack.sync], [0] [0]",
+        "E ##### [com.ex.pack.a]"}},
+      {"both listings fail", "package_info_foreach_app_from_package", 2, {},
+       {retry, "E try again package_info_foreach_app_from_package != PACKAGE_MANAGER_ERROR_NONE"}},
+      {"application cannot be opened", "app_info_create", 1, {}, {}},
+      {"game test fails", "app_info_is_game", 1, {}, {"E App [com.ex.pack.a], [-5] [1]"}},
+      {"no-display read fails", "app_info_is_nodisplay", 1, {}, {appA}},
+      {"id read fails", "app_info_get_app_id", 1, {}, {appA}},
   };
   AddPack({sim::GameApp("com.ex.pack.a", "A"), Service("com.ex.pack.sync")});
   for (const auto& c : cases) {
@@ -180,7 +158,10 @@ TEST_F(AppListsTest, PackageListingFailures) {
     device.ClearLogs();
     for (int i = 0; i < c.times; ++i) device.FailNext(c.call, -5, i);
     EXPECT_EQ(c.appIds, manager._GetAppIds("com.ex.pack"));
-    EXPECT_EQ(c.logs, EngineMessages());
+    Ids logs = {"E BEGIN"};
+    logs.insert(logs.end(), c.logs.begin(), c.logs.end());
+    logs.push_back("E END");
+    EXPECT_EQ(logs, EngineMessages());
     EXPECT_EQ(0, LeftOpen());
   }
 }
@@ -223,8 +204,7 @@ TEST_F(AppListsTest, MenuLaunchFailuresAnswerFalse) {
     int skip;
     Ids logs;
   } cases[] = {
-      {"app_info_filter_create",
-       0,
+      {"app_info_filter_create", 0,
        {"E (APP_MANAGER_ERROR_NONE != app_info_filter_create(&handle))"}},
       {"app_info_filter_add_string", 0, {}},
       {"app_info_filter_add_string", 1, {}},

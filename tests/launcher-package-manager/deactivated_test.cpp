@@ -123,11 +123,7 @@ TEST_F(DeactivatedTest, InfoFailures) {
       {"no icon: the default", "app_info_get_icon", 0, true, "capp", {"E Failed to get icon"}},
       {"no type: still read", "app_info_get_type", 0, true, "old", {"E Failed to get type"}},
       {"type query fails: still read", "app_info_filter_foreach_appinfo", 1, true, "old", {}},
-      {"package id of the type query",
-       "app_info_get_package",
-       1,
-       true,
-       "capp",
+      {"package id of the type query", "app_info_get_package", 1, true, "capp",
        {"E Failed to get pkgid"}},
   };
   for (const auto& c : cases) {

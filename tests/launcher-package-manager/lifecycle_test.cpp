@@ -74,10 +74,7 @@ TEST_F(LifecycleTest, PolicyAllowsUnlessTheServiceSaysOtherwise) {
   } cases[] = {
       {"allowed", true, MDM_ALLOWED, true, {}},
       {"restricted", true, MDM_RESTRICTED, false, {"E app[com.ex.racer] is not mdm allowed"}},
-      {"any other state",
-       true,
-       MDM_STATUS_ERROR,
-       false,
+      {"any other state", true, MDM_STATUS_ERROR, false,
        {"E app[com.ex.racer] is not mdm allowed"}},
       {"unreachable", false, MDM_RESTRICTED, true, {"E mdm_get_service() is failed"}},
   };

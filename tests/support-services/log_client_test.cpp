@@ -22,18 +22,10 @@ TEST_F(LogClientTest, EventsCarryOnlyTheKeysGivenToTheSelectedProvider) {
     const char* provider;
     Fields fields;
   } cases[] = {
-      {"com.ex.racer",
-       "x",
-       "1",
-       true,
-       kStatus,
+      {"com.ex.racer", "x", "1", true, kStatus,
        {{"app_id", "com.ex.racer"}, {"feature", "launch"}, {"extra", "x"}, {"value", "1"}}},
       {NULL, "x", NULL, false, kFeatureUse, {{"feature", "launch"}, {"extra", "x"}}},
-      {"com.ex.racer",
-       NULL,
-       "",
-       false,
-       kFeatureUse,
+      {"com.ex.racer", NULL, "", false, kFeatureUse,
        {{"app_id", "com.ex.racer"}, {"feature", "launch"}, {"value", ""}}},
       {NULL, NULL, NULL, true, kStatus, {{"feature", "launch"}}},
   };
