@@ -90,7 +90,8 @@ TEST_F(ListingsTest, FailedListingByAppIdLogsCompileAndBind) {
 
 // ---- The download view
 
-TEST_F(ListingsTest, DownloadViewListsAppBoxesInInsertOrderOnFourColumns) {
+TEST_F(ListingsTest, DownloadViewListsAppBoxesInInsertOrderFourToARow) {
+  store.m_maxRows = 2;  // a small page, so that eight boxes fill it
   int menuPage = AddPage(1, 1);
   int folderPage = AddPage(30, 1, true);
   AddBox(menuPage, "a", 4, 9);
@@ -98,31 +99,18 @@ TEST_F(ListingsTest, DownloadViewListsAppBoxesInInsertOrderOnFourColumns) {
   AddBox(menuPage, "c", 1, 1);
   AddBox(menuPage, "d", 2, 1);
   AddBox(AddPage(2, 1), "e", 3, 1);
+  for (int i = 0; i < 4; ++i) AddBox(menuPage, "f", 1, 1);
 
   std::vector<boost::shared_ptr<GameBoxData> > boxes = store.GetBoxDataListByDownload(77, true);
-  ASSERT_EQ(5u, boxes.size());
-  const char* expectedApps[] = {"a", "b", "c", "d", "e"};
+  ASSERT_EQ(9u, boxes.size());
   for (size_t i = 0; i < boxes.size(); ++i) {
-    EXPECT_EQ(expectedApps[i], boxes[i]->appId);
-    EXPECT_EQ(100001, boxes[i]->pageId);
+    EXPECT_EQ(std::string(1, i < 5 ? 'a' + i : 'f'), boxes[i]->appId);
+    EXPECT_EQ(i < 8 ? 100001 : 100002, boxes[i]->pageId);
     EXPECT_EQ(77, boxes[i]->parentId);
   }
-  EXPECT_EQ((std::vector<std::pair<int, int> >{{1, 1}, {2, 1}, {3, 1}, {4, 1}, {1, 2}}),
+  EXPECT_EQ((std::vector<std::pair<int, int> >{
+                {1, 1}, {2, 1}, {3, 1}, {4, 1}, {1, 2}, {2, 2}, {3, 2}, {4, 2}, {1, 1}}),
             Cells(boxes));
-}
-
-TEST_F(ListingsTest, DownloadViewOpensTheNextVirtualPageAfterTheLastRow) {
-  store.m_maxRows = 2;  // a small page, so that eight boxes fill it
-  int page = AddPage(1, 1);
-  for (int i = 0; i < 10; ++i) AddBox(page, "app" + std::to_string(i), 1, 1);
-  std::vector<boost::shared_ptr<GameBoxData> > boxes = store.GetBoxDataListByDownload(1, false);
-  ASSERT_EQ(10u, boxes.size());
-  EXPECT_EQ(100001, boxes[7]->pageId);
-  EXPECT_EQ(4, boxes[7]->col);
-  EXPECT_EQ(2, boxes[7]->row);
-  EXPECT_EQ(100002, boxes[8]->pageId);
-  EXPECT_EQ(1, boxes[8]->col);
-  EXPECT_EQ(1, boxes[8]->row);
 }
 
 TEST_F(ListingsTest, DownloadPagesCoverTheCountedBoxes) {

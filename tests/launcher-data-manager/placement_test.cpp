@@ -1,6 +1,8 @@
 // Where a new application's box goes.
 #include "launcher-data-manager/store-test.h"
 
+#include <functional>
+
 namespace {
 
 class PlacementTest : public StoreTest {
@@ -28,58 +30,55 @@ TEST_F(PlacementTest, FirstAppOfAnEmptyMenuOpensPageOne) {
                      "boxType, launchType, iconPath, content FROM Boxes"));
 }
 
-TEST_F(PlacementTest, NextAppFollowsTheLastBoxPastTheHolesAndWrapsAtFourColumns) {
-  int page = AddPage(apps, 1);
-  AddBox(page, "a", 1, 1);
-  AddBox(page, "b", 3, 7);
-  AddBox(page, "c", 4, 7);
+// After the last box of the highest-numbered page, never in a hole.
+TEST_F(PlacementTest, NextAppGoesAfterTheLastBoxOfTheLastPage) {
   struct Case {
-    bool pageAddedBefore;
-    std::string appId;
-    std::string place;
-  } cases[] = {{false, "d", "1:1,8"}, {true, "e", "1:2,8"}};
+    const char* name;
+    std::function<void()> layout;
+    const char* place;
+    bool pageAdded;
+  } cases[] = {
+      {"on the last box's row, past the holes",
+       [&] {
+         int page = AddPage(apps, 1);
+         AddBox(page, "a", 1, 1);
+         AddBox(page, "b", 3, 7);
+       },
+       "1:4,7", false},
+      {"after the fourth column: the next row", [&] { AddBox(AddPage(apps, 1), "a", 4, 7); },
+       "1:1,8", false},
+      {"the highest-numbered page of this menu",
+       [&] {
+         AddBox(AddPage(apps, 2), "b", 1, 1);
+         AddBox(AddPage(apps, 1), "a", 4, 9);
+         AddBox(AddPage(2, 3), "other menu", 4, 4);
+         AddBox(AddPage(apps, 9, true), "folder 1", 4, 4);
+       },
+       "2:2,1", false},
+      {"an empty last page: its first cell",
+       [&] {
+         AddBox(AddPage(apps, 1), "a", 2, 2);
+         AddPage(apps, 2);
+       },
+       "2:1,1", false},
+      {"row 0 at the fourth column: a new page", [&] { AddBox(AddPage(apps, 3), "a", 4, 0); },
+       "4:1,1", true},
+      {"row 0 short of the fourth column: followed", [&] { AddBox(AddPage(apps, 5), "a", 2, 0); },
+       "5:3,0", false},
+  };
   for (const Case& c : cases) {
-    bool pageAdded = c.pageAddedBefore;
-    store.InsertBoxData(c.appId, pageAdded);
-    EXPECT_EQ(c.pageAddedBefore, pageAdded) << c.appId;  // never cleared, not set here
-    EXPECT_EQ(c.place, PlaceOf(c.appId));
+    SCOPED_TRACE(c.name);
+    db->Exec("DELETE FROM Boxes; DELETE FROM Pages");
+    c.layout();
+    bool pageAdded = false;
+    store.InsertBoxData("new", pageAdded);
+    EXPECT_EQ(c.place, PlaceOf("new"));
+    EXPECT_EQ(c.pageAdded, pageAdded);
   }
-  EXPECT_EQ("1", db->Value("SELECT count(*) FROM Pages"));
-}
-
-TEST_F(PlacementTest, TheLastPageIsTheOneNumberedHighest) {
-  int second = AddPage(apps, 2);
-  int first = AddPage(apps, 1);
-  AddBox(first, "a", 4, 9);
-  AddBox(second, "b", 1, 1);
-  AddBox(AddPage(2, 3), "other menu", 4, 4);
-  AddBox(AddPage(apps, 9, true), "folder 1", 4, 4);
-  bool pageAdded = false;
-  store.InsertBoxData("c", pageAdded);
-  EXPECT_EQ("2:2,1", PlaceOf("c"));
-}
-
-TEST_F(PlacementTest, AnEmptyLastPageTakesTheAppInItsFirstCell) {
-  AddBox(AddPage(apps, 1), "a", 2, 2);
-  AddPage(apps, 2);
-  bool pageAdded = false;
-  store.InsertBoxData("b", pageAdded);
-  EXPECT_EQ("2:1,1", PlaceOf("b"));
-  EXPECT_FALSE(pageAdded);
-}
-
-TEST_F(PlacementTest, ALastBoxInRowZeroStartsANewPage) {
-  int page = AddPage(apps, 3);
-  AddBox(page, "a", 4, 0);
-  bool pageAdded = false;
-  store.InsertBoxData("b", pageAdded);
+  bool pageAdded = true;  // a placement that adds no page leaves the flag alone
+  store.InsertBoxData("next", pageAdded);
   EXPECT_TRUE(pageAdded);
-  EXPECT_EQ("4:1,1", PlaceOf("b"));
-
-  // Short of the last column, row 0 is simply followed.
-  AddBox(AddPage(apps, 5), "c", 2, 0);
-  store.InsertBoxData("d", pageAdded);
-  EXPECT_EQ("5:3,0", PlaceOf("d"));
+  EXPECT_EQ("5:4,0", PlaceOf("next"));
 }
 
 TEST_F(PlacementTest, AFullPageOfFortyThousandRowsWrapsToANewPage) {
