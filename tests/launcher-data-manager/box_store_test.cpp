@@ -139,16 +139,6 @@ TEST_F(BoxStoreTest, GetMenuBoxDataReadsEveryStoredMember) {
   EXPECT_EQ("", read->pkgId);  // never stored
 }
 
-TEST_F(BoxStoreTest, GetMenuBoxDataNeedsTheBoxAndItsPage) {
-  int id = AddBox(page, "a", 1, 1);
-  EXPECT_EQ(0, store.GetMenuBoxData(id + 1)->boxId);
-  db->Exec("DELETE FROM Pages");
-  boost::shared_ptr<GameBoxData> orphan = store.GetMenuBoxData(id);
-  ASSERT_TRUE(orphan);
-  EXPECT_EQ(0, orphan->boxId);
-  EXPECT_EQ("", orphan->appId);
-}
-
 TEST_F(BoxStoreTest, DeleteRemovesOneBoxAndLeavesAFoldersPages) {
   GameBoxData folder = Box(true, 0);
   int id = store.InsertBoxData(folder);

@@ -87,19 +87,6 @@ TEST_F(PackingTest, ReorderKeepsEmptyPagesWhenThereIsNoBoxAtAll) {
 
 // ---- Reflowed across pages
 
-TEST_F(PackingTest, ReorderWithoutSpacePoursBoxesFromTheFirstCell) {
-  int first = AddPage(1, 1);
-  int second = AddPage(1, 2);
-  AddBox(first, "a", 1, 1);
-  AddBox(first, "b", 3, 1);
-  AddBox(second, "c", 2, 5);
-
-  store._ReorderDataWithoutSpace(1, false);
-
-  EXPECT_EQ((std::vector<std::string>{"a@1:1,1", "b@1:2,1", "c@1:3,1"}), Layout(1, false));
-  EXPECT_EQ(std::to_string(first) + ":1", PageNumbers(1, false));
-}
-
 TEST_F(PackingTest, ReorderWithoutSpaceUsesTheMenuGridForFoldersAndDropsEmptyPages) {
   int page = AddPage(7, 1, true);
   for (int i = 0; i < 5; ++i) AddBox(page, "f" + std::to_string(i), 1, i + 1);

@@ -1,5 +1,5 @@
-// System information: the screen-size class, the date, the policy switch and
-// the launcher's integer text.
+// System information: the screen-size class, the date and the launcher's
+// integer text. (The policy switch is seen through IsMDMRestriected.)
 #include <dlog.h>
 #include <system_info.h>
 #include <time.h>
@@ -65,8 +65,6 @@ TEST_F(SystemInfoTest, DateIsTheLocalDayOfTheMonth) {
   struct tm after_tm = *localtime(&after);
   EXPECT_TRUE(day == before_tm.tm_mday || day == after_tm.tm_mday);
 }
-
-TEST_F(SystemInfoTest, PolicyChecksAreOff) { EXPECT_FALSE(SystemInfo::IsMdmEnabled()); }
 
 TEST_F(SystemInfoTest, IntegersBecomeSignedDecimalText) {
   EXPECT_EQ("0", Korrin3D::to_string(0));
