@@ -88,6 +88,7 @@ TEST_F(AppInfoTest, WhatTheDeviceReportsShapesTheRecord) {
     EXPECT_EQ(c.enabled, box->isEnabled);
     EXPECT_EQ(c.read ? "com.ex.racer" : "", box->appId);
     EXPECT_EQ(c.read ? 1u : 0u, manager.m_appInfoCache.size());
+    EXPECT_EQ(c.read ? 2u : 1u, EngineMessages().size());  // the type line comes first
     EXPECT_EQ(c.log, EngineMessages().back());
     EXPECT_EQ(0, LeftOpen());
   }
