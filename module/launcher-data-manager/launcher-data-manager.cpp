@@ -66,6 +66,31 @@ void BindBoxTexts(Statement& stmt, const GameBoxData& box) {
   stmt.BindTextIfNotEmpty("$content", box.content);
 }
 
+// Reads the columns most box look-ups select, in this order from |first|:
+// isFolder, pageId, col, row, appId, name, parentId, isPreload, isSystem.
+// Returns the column after them.
+int ReadBoxPlace(const Statement& stmt, int first, GameBoxData* box) {
+  int c = first;
+  box->isFolder = stmt.Bool(c++);
+  box->pageId = stmt.Int(c++);
+  box->col = stmt.Int(c++);
+  box->row = stmt.Int(c++);
+  box->appId = stmt.Text(c++);
+  box->name = stmt.Text(c++);
+  box->parentId = stmt.Int(c++);
+  box->isPreload = stmt.Bool(c++);
+  box->isSystem = stmt.Bool(c++);
+  return c;
+}
+
+// Reads boxType, launchType, iconPath and content, in this order from |first|.
+void ReadBoxKind(const Statement& stmt, int first, GameBoxData* box) {
+  box->boxType = stmt.Int(first);
+  box->launchType = stmt.Int(first + 1);
+  box->iconPath = stmt.Text(first + 2);
+  box->content = stmt.Text(first + 3);
+}
+
 // The id of the k-th virtual page of a parent in the alphabetical view. A
 // folder's pages carry its boxId in the high part; like the device, the
 // product wraps for very large box ids rather than failing.
@@ -178,6 +203,21 @@ void PackFolderPages(LauncherDataManager& store, int folderBoxId) {
       store.DeletePageData(pages[i]->pageId);
     } else {
       PackBoxes(store, boxes, store.m_columns, INT_MAX, true);
+    }
+  }
+}
+
+// Numbers the pages from 1 in their order, deleting on the way each page left
+// without boxes unless |keepEmpty| is set.
+void RenumberPages(LauncherDataManager& store, const std::vector<PagePtr>& pages, bool keepEmpty) {
+  int pageNo = 1;
+  for (size_t i = 0; i < pages.size(); ++i) {
+    if (!pages[i]) continue;
+    if (!keepEmpty && store.GetBoxDataList(pages[i]->pageId).empty()) {
+      store.DeletePageData(pages[i]->pageId);
+    } else {
+      pages[i]->pageNo = pageNo++;
+      store.UpdatePageData(*pages[i]);
     }
   }
 }
@@ -444,19 +484,7 @@ BoxPtr LauncherDataManager::GetMenuBoxData(int boxId) {
   Statement stmt(m_db, sql.str(), kPrepareLegacy);
   if (!stmt.Step()) return box;
   box->boxId = boxId;
-  box->isFolder = stmt.Bool(0);
-  box->pageId = stmt.Int(1);
-  box->col = stmt.Int(2);
-  box->row = stmt.Int(3);
-  box->appId = stmt.Text(4);
-  box->name = stmt.Text(5);
-  box->parentId = stmt.Int(6);
-  box->isPreload = stmt.Bool(7);
-  box->isSystem = stmt.Bool(8);
-  box->boxType = stmt.Int(9);
-  box->launchType = stmt.Int(10);
-  box->iconPath = stmt.Text(11);
-  box->content = stmt.Text(12);
+  ReadBoxKind(stmt, ReadBoxPlace(stmt, 0, box.get()), box.get());
   return box;
 }
 
@@ -494,15 +522,7 @@ BoxPtr LauncherDataManager::GetBoxDataByAppId(std::string appId) {
     return box;
   }
   box->boxId = stmt.Int(0);
-  box->isFolder = stmt.Bool(1);
-  box->pageId = stmt.Int(2);
-  box->col = stmt.Int(3);
-  box->row = stmt.Int(4);
-  box->appId = stmt.Text(5);
-  box->name = stmt.Text(6);
-  box->parentId = stmt.Int(7);
-  box->isPreload = stmt.Bool(8);
-  box->isSystem = stmt.Bool(9);
+  ReadBoxPlace(stmt, 1, box.get());
   return box;
 }
 
@@ -545,19 +565,7 @@ std::vector<BoxPtr> LauncherDataManager::GetBoxDataList(int pageId) {
   while (stmt.Step()) {
     BoxPtr box(new GameBoxData);
     box->boxId = stmt.Int(0);
-    box->isFolder = stmt.Bool(1);
-    box->pageId = stmt.Int(2);
-    box->col = stmt.Int(3);
-    box->row = stmt.Int(4);
-    box->appId = stmt.Text(5);
-    box->name = stmt.Text(6);
-    box->parentId = stmt.Int(7);
-    box->isPreload = stmt.Bool(8);
-    box->isSystem = stmt.Bool(9);
-    box->boxType = stmt.Int(10);
-    box->launchType = stmt.Int(11);
-    box->iconPath = stmt.Text(12);
-    box->content = stmt.Text(13);
+    ReadBoxKind(stmt, ReadBoxPlace(stmt, 1, box.get()), box.get());
     boxes.push_back(box);
   }
   return boxes;
@@ -588,10 +596,7 @@ std::vector<BoxPtr> LauncherDataManager::GetBoxDataListByAppId(std::string appId
     box->row = stmt.Int(7);
     box->isPreload = stmt.Bool(8);
     box->isSystem = stmt.Bool(9);
-    box->boxType = stmt.Int(10);
-    box->launchType = stmt.Int(11);
-    box->iconPath = stmt.Text(12);
-    box->content = stmt.Text(13);
+    ReadBoxKind(stmt, 10, box.get());
     boxes.push_back(box);
   }
   return boxes;
@@ -689,16 +694,7 @@ void LauncherDataManager::_ReorderData(int parentId, bool isFolder) {
   }
 
   // With nothing placed at all, empty pages are kept and only renumbered.
-  int pageNo = 1;
-  for (size_t i = 0; i < pages.size(); ++i) {
-    if (!pages[i]) continue;
-    if (placed != 0 && GetBoxDataList(pages[i]->pageId).empty()) {
-      DeletePageData(pages[i]->pageId);
-    } else {
-      pages[i]->pageNo = pageNo++;
-      UpdatePageData(*pages[i]);
-    }
-  }
+  RenumberPages(*this, pages, placed == 0);
 }
 
 void LauncherDataManager::_ReorderDataWithoutSpace(int parentId, bool isFolder) {
@@ -732,16 +728,7 @@ void LauncherDataManager::_ReorderDataWithoutSpace(int parentId, bool isFolder) 
     }
   }
 
-  int pageNo = 1;
-  for (size_t i = 0; i < pages.size(); ++i) {
-    if (!pages[i]) continue;
-    if (GetBoxDataList(pages[i]->pageId).empty()) {
-      DeletePageData(pages[i]->pageId);
-    } else {
-      pages[i]->pageNo = pageNo++;
-      UpdatePageData(*pages[i]);
-    }
-  }
+  RenumberPages(*this, pages, false);
 }
 
 void LauncherDataManager::RearrangeAppsPosition() {
@@ -795,10 +782,7 @@ BoxPtr ReadAlphabeticalBox(const Statement& stmt) {
   box->name = stmt.Text(3);
   box->isPreload = stmt.Bool(4);
   box->isSystem = stmt.Bool(5);
-  box->boxType = stmt.Int(6);
-  box->launchType = stmt.Int(7);
-  box->iconPath = stmt.Text(8);
-  box->content = stmt.Text(9);
+  ReadBoxKind(stmt, 6, box.get());
   return box;
 }
 
