@@ -34,6 +34,9 @@ const int kVirtualPageBase = 100000;
 // New applications always go to this menu.
 const int kFirstMenuId = 1;
 
+// Packed pages grow downward without limit.
+const int kNoRowBound = INT_MAX;
+
 // The alphabetical view and its packing lay folders out 3 by 3.
 const int kFolderColumns = 3;
 const int kFolderRows = 3;
@@ -69,7 +72,7 @@ void BindBoxTexts(Statement& stmt, const GameBoxData& box) {
 // Reads the columns most box look-ups select, in this order from |first|:
 // isFolder, pageId, col, row, appId, name, parentId, isPreload, isSystem.
 // Returns the column after them.
-int ReadBoxPlace(const Statement& stmt, int first, GameBoxData* box) {
+int ReadBoxCommon(const Statement& stmt, int first, GameBoxData* box) {
   int c = first;
   box->isFolder = stmt.Bool(c++);
   box->pageId = stmt.Int(c++);
@@ -202,7 +205,7 @@ void PackFolderPages(LauncherDataManager& store, int folderBoxId) {
     if (pages.size() > 1 && boxes.empty()) {
       store.DeletePageData(pages[i]->pageId);
     } else {
-      PackBoxes(store, boxes, store.m_columns, INT_MAX, true);
+      PackBoxes(store, boxes, store.m_columns, kNoRowBound, true);
     }
   }
 }
@@ -246,7 +249,7 @@ void LauncherDataManager::_CreateTables() {
   char* error = NULL;
   int rc = sqlite3_exec(m_db, kSchema, NULL, NULL, &error);
   if (rc != SQLITE_OK) {
-    KLOG(DLOG_ERROR, "SQL error(%d) : %s", rc, error);
+    KLOG(DLOG_ERROR, "SQL error(%d) : %s", rc, error != NULL ? error : "");
     sqlite3_free(error);
   }
 }
@@ -484,7 +487,8 @@ BoxPtr LauncherDataManager::GetMenuBoxData(int boxId) {
   Statement stmt(m_db, sql.str(), kPrepareLegacy);
   if (!stmt.Step()) return box;
   box->boxId = boxId;
-  ReadBoxKind(stmt, ReadBoxPlace(stmt, 0, box.get()), box.get());
+  int next = ReadBoxCommon(stmt, 0, box.get());
+  ReadBoxKind(stmt, next, box.get());
   return box;
 }
 
@@ -522,7 +526,7 @@ BoxPtr LauncherDataManager::GetBoxDataByAppId(std::string appId) {
     return box;
   }
   box->boxId = stmt.Int(0);
-  ReadBoxPlace(stmt, 1, box.get());
+  ReadBoxCommon(stmt, 1, box.get());
   return box;
 }
 
@@ -565,7 +569,8 @@ std::vector<BoxPtr> LauncherDataManager::GetBoxDataList(int pageId) {
   while (stmt.Step()) {
     BoxPtr box(new GameBoxData);
     box->boxId = stmt.Int(0);
-    ReadBoxKind(stmt, ReadBoxPlace(stmt, 1, box.get()), box.get());
+    int next = ReadBoxCommon(stmt, 1, box.get());
+    ReadBoxKind(stmt, next, box.get());
     boxes.push_back(box);
   }
   return boxes;
@@ -748,8 +753,7 @@ void LauncherDataManager::RearrangeAppsPosition() {
       pages[p]->pageNo = pageNo++;
       UpdatePageData(*pages[p]);
 
-      // No row bound here: a menu page grows downward.
-      PackBoxes(*this, boxes, m_columns, INT_MAX, false);
+      PackBoxes(*this, boxes, m_columns, kNoRowBound, false);
       for (size_t b = 0; b < boxes.size(); ++b) {
         if (boxes[b] && boxes[b]->isFolder) PackFolderPages(*this, boxes[b]->boxId);
       }
@@ -922,6 +926,7 @@ int LauncherDataManager::UpdateBoxDataForAlphaBeticalOrder(GameBoxData& box) {
     PagePtr dropped = GetMenuPageData(box.pageId);
     if (dropped->pageId != 0) {
       targetParent = dropped->parentId;
+      targetIsFolder = false;
     } else {
       KLOG(DLOG_ERROR, "No page [%d]", box.pageId);
       targetParent = box.parentId;
@@ -936,6 +941,7 @@ int LauncherDataManager::UpdateBoxDataForAlphaBeticalOrder(GameBoxData& box) {
         << "name = $name "
         << " WHERE boxId = " << box.boxId;
     Statement rename(m_db, sql.str(), kPrepareV2);
+    // Like every update, an empty name is stored as NULL.
     rename.BindTextIfNotEmpty("$name", box.name);
     rename.Step();
     return 0;
