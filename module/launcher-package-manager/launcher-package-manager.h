@@ -30,7 +30,7 @@ class LauncherPackageManager {
  public:
   // The kind of a package job. The numbering is the launcher's own, not the
   // platform's: install (1) and update (3) differ only in the value-2 bit.
-  enum PkgJobType {
+  enum PkgJobType : int {
     PKG_JOB_NONE = 0,
     PKG_JOB_INSTALL = 1,
     PKG_JOB_UNINSTALL = 2,
@@ -78,8 +78,8 @@ class LauncherPackageManager {
   // otherwise trusts it as it stands. False only when the platform query
   // could not be made.
   bool GetAppIdList(std::vector<std::string>& appIds);
-  // The ids of the displayable applications of |pkgId|, or an empty list. A
-  // package whose first application is not a game lists nothing after it.
+  // The ids of the displayable applications of |pkgId|, or an empty list. The
+  // listing stops at the package's first application that is not a game.
   std::vector<std::string> _GetAppIds(const char* pkgId);
   // Whether |appId| is a floating application or is declared to be launched
   // from the menu. False on any failure, and for an unknown application.

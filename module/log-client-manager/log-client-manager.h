@@ -4,7 +4,7 @@
 #ifndef KORRIN_LOG_CLIENT_MANAGER_LOG_CLIENT_MANAGER_H_
 #define KORRIN_LOG_CLIENT_MANAGER_LOG_CLIENT_MANAGER_H_
 
-struct velmora_log_manager_s;
+#include <velmora_log_manager.h>
 
 class LogClientManager {
  public:
@@ -25,7 +25,7 @@ class LogClientManager {
   LogClientManager(const LogClientManager&) = delete;
   LogClientManager& operator=(const LogClientManager&) = delete;
 
-  velmora_log_manager_s* m_logManager;  // owned; null if the client could not be opened
+  velmora_log_manager_h m_logManager;  // owned; null if the client could not be opened
 };
 
 #endif  // KORRIN_LOG_CLIENT_MANAGER_LOG_CLIENT_MANAGER_H_

@@ -12,7 +12,8 @@ class SystemInfo {
   // 320x480, 2 for 800x1280, 3 for 720x1280, 4 for 1080x1920, 5 for 540x960;
   // 6 for any other size, and when the size cannot be read (logged).
   static int GetScreenResolution();
-  // The day of the month, 1 to 31, in local time.
+  // The day of the month, 1 to 31, in local time; 0 if the local time
+  // cannot be read.
   static int GetCurrentDate();
   // Whether device-management policy checks are switched on: never, here.
   static bool IsMdmEnabled();

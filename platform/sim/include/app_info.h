@@ -10,6 +10,7 @@ extern "C" {
 
 typedef struct app_info_s* app_info_h;
 typedef struct app_info_filter_s* app_info_filter_h;
+typedef struct app_info_metadata_filter_s* app_info_metadata_filter_h;
 
 typedef enum {
   APP_INFO_EVENT_INSTALLED = 0,

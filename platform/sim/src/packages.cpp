@@ -120,12 +120,13 @@ void Device::Update(const Package& pkg) {
                 [&] { AddPackage(updated); });
 }
 
+// |pkgId| is copied first: it may be the id of the package being removed.
 bool Device::Uninstall(const std::string& pkgId) {
-  const Package* pkg = InstalledPackage(pkgId);
+  std::string id = pkgId;
+  const Package* pkg = InstalledPackage(id);
   if (pkg == NULL) return false;
   std::string type = pkg->type;
-  PlayOperation(type, pkgId, PACKAGE_MANAGER_EVENT_TYPE_UNINSTALL,
-                [&] { RemovePackage(pkgId); });
+  PlayOperation(type, id, PACKAGE_MANAGER_EVENT_TYPE_UNINSTALL, [&] { RemovePackage(id); });
   return true;
 }
 
