@@ -9,8 +9,6 @@
 
 namespace {
 
-typedef std::vector<std::string> Ids;
-
 class LifecycleTest : public PackageManagerTest {};
 
 TEST_F(LifecycleTest, ClientLivesFromConstructionUntilTerminate) {
