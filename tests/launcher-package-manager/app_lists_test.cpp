@@ -163,7 +163,7 @@ TEST_F(AppListsTest, PackageListingFailures) {
 
 // ---- _IsMenuLaunch
 
-TEST_F(AppListsTest, MenuLaunchIsAFloatingCategoryOrTheFirstMetadataPair) {
+TEST_F(AppListsTest, MenuLaunchIsAFloatingCategoryOrTheFirstMetadataPairAndFalseOnFailure) {
   const std::pair<std::string, std::string> menuLaunch = {
       "http://velmora.com/tizen/metadata/menu/launch/operation", APP_CONTROL_OPERATION_MAIN};
   struct {
@@ -174,10 +174,10 @@ TEST_F(AppListsTest, MenuLaunchIsAFloatingCategoryOrTheFirstMetadataPair) {
   } cases[] = {
       {"plain", {}, {}, false},
       {"floating", {"http://velmora.com/category/floatingapp"}, {}, true},
-      {"menu launch first", {}, {menuLaunch, {"k", "v"}}, true},
       {"menu launch second: only the first pair is looked at", {}, {{"k", "v"}, menuLaunch}, false},
       {"another operation", {}, {{menuLaunch.first, APP_CONTROL_OPERATION_DEFAULT}}, false},
       {"another authority", {"http://tizen.org/category/floatingapp"}, {}, false},
+      {"menu launch first", {}, {menuLaunch, {"k", "v"}}, true},
   };
   device.AddGame("com.ex.racer", "Racer");
   for (const auto& c : cases) {
@@ -188,17 +188,13 @@ TEST_F(AppListsTest, MenuLaunchIsAFloatingCategoryOrTheFirstMetadataPair) {
   EXPECT_FALSE(manager._IsMenuLaunch("com.ex.unknown"));
   EXPECT_TRUE(EngineMessages().empty());
   EXPECT_EQ(0, LeftOpen());
-}
 
-TEST_F(AppListsTest, MenuLaunchFailuresAnswerFalse) {
-  device.AddGame("com.ex.racer", "Racer");
-  device.FindApp("com.ex.racer")->metadata = {
-      {"http://velmora.com/tizen/metadata/menu/launch/operation", APP_CONTROL_OPERATION_MAIN}};
+  // The last case's application again, with one call failing each time.
   struct {
     const char* call;
     int skip;
     Ids logs;
-  } cases[] = {
+  } failures[] = {
       {"app_info_filter_create", 0,
        {"E (APP_MANAGER_ERROR_NONE != app_info_filter_create(&handle))"}},
       {"app_info_filter_add_string", 0, {}},
@@ -207,12 +203,12 @@ TEST_F(AppListsTest, MenuLaunchFailuresAnswerFalse) {
       {"app_info_create", 0, {}},
       {"app_info_foreach_metadata", 0, {}},
   };
-  for (const auto& c : cases) {
-    SCOPED_TRACE(c.call);
+  for (const auto& f : failures) {
+    SCOPED_TRACE(f.call);
     device.ClearLogs();
-    device.FailNext(c.call, APP_MANAGER_ERROR_IO_ERROR, c.skip);
+    device.FailNext(f.call, APP_MANAGER_ERROR_IO_ERROR, f.skip);
     EXPECT_FALSE(manager._IsMenuLaunch("com.ex.racer"));
-    EXPECT_EQ(c.logs, EngineMessages());
+    EXPECT_EQ(f.logs, EngineMessages());
     EXPECT_EQ(0, LeftOpen());
   }
   EXPECT_TRUE(manager._IsMenuLaunch("com.ex.racer"));

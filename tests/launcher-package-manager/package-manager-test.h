@@ -30,7 +30,8 @@ class PackageManagerTest : public SimTest {
                       b.isMdmRestricted}) {
       flags += flag ? '1' : '0';
     }
-    return {b.pkgId, b.appId, b.pkgType, b.name, b.iconPath, flags + " " + std::to_string(b.appSize)};
+    return {b.pkgId, b.appId, b.pkgType, b.name, b.iconPath,
+            flags + " " + std::to_string(b.appSize)};
   }
 
   // Handles still open beyond the manager's own listening client.
