@@ -144,10 +144,14 @@ TEST_F(PackingTest, RearrangePacksFolderPagesFourWideInOneTransactionAndASecondP
   AddBox(folderPage, "y", 1, 3);
   AddBox(folderPage, "z", 4, 3);
   AddBox(folderPage, "w", 2, 4);
+  int lone = AddBoxSql("isFolder, pageId, name, col, row",
+                       "1, " + std::to_string(page) + ", 'G', 4, 4");
+  int lonePage = AddPage(lone, 1, true);  // empty, but the folder's only page: stays
 
   store.RearrangeAppsPosition();
 
-  EXPECT_EQ((std::vector<std::string>{"F@1:1,1"}), Layout(apps, false));
+  EXPECT_EQ((std::vector<std::string>{"F@1:1,1", "G@1:2,1"}), Layout(apps, false));
+  EXPECT_EQ(std::to_string(lonePage) + ":1", PageNumbers(lone, true));
   // A nested folder keeps its cell and takes none; the page is not renumbered.
   EXPECT_EQ((std::vector<std::string>{"x@2:1,1", "y@2:2,1", "z@2:3,1", "w@2:4,1", "nested@2:2,2"}),
             Layout(folder, true));

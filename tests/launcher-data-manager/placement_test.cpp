@@ -99,6 +99,9 @@ TEST_F(PlacementTest, AFullPageWrapsAfterRow40000AndForADeactivatedAppAfterRow40
   FillPage(page, 160000, "other");
   store.InsertBoxDataForDeactivatedApp(other, "row 40001");
   EXPECT_EQ("1:1,40001", PlaceOf("row 40001"));
+  AddBox(page, "end of 40001", 4, 40001);
+  store.InsertBoxDataForDeactivatedApp(other, "row 40002");
+  EXPECT_EQ("1:1,40002", PlaceOf("row 40002"));
   AddBox(page, "last", 4, 40002);
   store.InsertBoxDataForDeactivatedApp(other, "wrapped");
   EXPECT_EQ("2:1,1", PlaceOf("wrapped"));
