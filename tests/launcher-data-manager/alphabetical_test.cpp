@@ -21,23 +21,19 @@ class AlphabeticalTest : public StoreTest {
     return placed;
   }
 
+  // "parentId/isFolder pageNo:col,row" of a stored box.
   std::string StoredPlace(int boxId) {
     return db->Value("SELECT p.parentId || '/' || p.isFolder || ' ' || p.pageNo || ':' || b.col "
                      "|| ',' || b.row FROM Boxes b, Pages p ON p.pageId = b.pageId WHERE boxId = " +
                      std::to_string(boxId));
   }
 
-  GameBoxData Dropped(int boxId, int pageId, int parentId, const std::string& name) {
+  // The screen drops the box |boxId|, renamed |name|, on |pageId| of |parentId|.
+  int Drop(int boxId, int pageId, int parentId, const std::string& name) {
     GameBoxData box = *store.GetMenuBoxData(boxId);
     box.pageId = pageId;
     box.parentId = parentId;
     box.name = name;
-    return box;
-  }
-
-  // The screen drops the box |boxId|, named |name|, on |pageId| of |parentId|.
-  int Drop(int boxId, int pageId, int parentId, const std::string& name) {
-    GameBoxData box = Dropped(boxId, pageId, parentId, name);
     return store.UpdateBoxDataForAlphaBeticalOrder(box);
   }
 };
@@ -61,7 +57,7 @@ TEST_F(AlphabeticalTest, MenuBoxesByNameWithoutRegardToCase) {
   EXPECT_EQ("id.Alpha", boxes[0]->appId);
 }
 
-TEST_F(AlphabeticalTest, FolderBoxesFillVirtualPagesNineAtATime) {
+TEST_F(AlphabeticalTest, FolderBoxesFillVirtualPagesNineAtATimeAnEmptyMenuShowsOnePage) {
   int first = AddPage(42, 1, true);
   int second = AddPage(42, 2, true);
   for (char c = 'a'; c < 'j'; ++c) AddNamedBox(first, std::string(1, c));
@@ -73,26 +69,16 @@ TEST_F(AlphabeticalTest, FolderBoxesFillVirtualPagesNineAtATime) {
   EXPECT_EQ("d@4200001:1,2", placed[3]);
   EXPECT_EQ("i@4200001:3,3", placed[8]);
   EXPECT_EQ("j@4200002:1,1", placed[9]);
-
-  std::vector<boost::shared_ptr<GamePageData> > pages =
-      store.GetPageDataListByAlphabeticalOrder(42, true);
-  ASSERT_EQ(2u, pages.size());
-  EXPECT_EQ(4200001, pages[0]->pageId);
-  EXPECT_EQ(4200002, pages[1]->pageId);
-  EXPECT_EQ(2, pages[1]->pageNo);
-  EXPECT_TRUE(pages[1]->isFolder);
+  EXPECT_EQ((std::vector<Row>{{"4200001", "1", "42", "1"}, {"4200002", "1", "42", "2"}}),
+            Fields(store.GetPageDataListByAlphabeticalOrder(42, true)));
   EXPECT_EQ(42, store.m_pageMap[4200002]);
   EXPECT_TRUE(store.m_pageFlagMap[4200002]);
-}
 
-TEST_F(AlphabeticalTest, AnEmptyMenuShowsOnePageAndAnEmptyFolderNone) {
-  std::vector<boost::shared_ptr<GamePageData> > pages =
-      store.GetPageDataListByAlphabeticalOrder(1, false);
-  ASSERT_EQ(1u, pages.size());
-  EXPECT_EQ(100001, pages[0]->pageId);
+  // An empty menu still shows one page, an empty folder none.
+  EXPECT_EQ((std::vector<Row>{{"100001", "0", "1", "1"}}),
+            Fields(store.GetPageDataListByAlphabeticalOrder(1, false)));
   EXPECT_EQ(1, store.m_pageMap[100001]);
   EXPECT_FALSE(store.m_pageFlagMap[100001]);
-  EXPECT_TRUE(store.GetBoxDataListByAlphabeticalOrder(1, false).empty());
   EXPECT_TRUE(store.GetPageDataListByAlphabeticalOrder(9, true).empty());
 }
 
@@ -120,8 +106,7 @@ TEST_F(AlphabeticalTest, RealPagesFollowTheStoredPagesAndStopAtTheLast) {
 // ---- Edits
 
 TEST_F(AlphabeticalTest, InsertStoresTheCallersBoxAtTheEndOfMenuOne) {
-  int page = AddPage(1, 1);
-  AddNamedBox(page, "x", 2, 3);
+  AddNamedBox(AddPage(1, 1), "x", 2, 3);
   GameBoxData shortcut;
   shortcut.boxType = 3;
   shortcut.appId = "com.ex.racer";
@@ -140,10 +125,11 @@ TEST_F(AlphabeticalTest, InsertStoresTheCallersBoxAtTheEndOfMenuOne) {
 }
 
 TEST_F(AlphabeticalTest, DroppedOnItsOwnParentOnlyTheNameChanges) {
-  int page = AddPage(1, 1);
-  int id = AddNamedBox(page, "old", 3, 2);
+  int id = AddNamedBox(AddPage(1, 1), "old", 3, 2);
   store.GetPageDataListByAlphabeticalOrder(1, false);
-  GameBoxData box = Dropped(id, 100001, 1, "new");
+  GameBoxData box = *store.GetMenuBoxData(id);
+  box.pageId = 100001;
+  box.name = "new";
   box.col = 1;
   TakeStatements();
 
@@ -151,9 +137,8 @@ TEST_F(AlphabeticalTest, DroppedOnItsOwnParentOnlyTheNameChanges) {
 
   EXPECT_EQ("1/0 1:3,2", StoredPlace(id));
   EXPECT_EQ("new", db->Value("SELECT name FROM Boxes"));
-  std::vector<std::string> statements = TakeStatements();
   EXPECT_EQ("UPDATE boxes set name = $name  WHERE boxId = " + std::to_string(id),
-            statements.back());
+            TakeStatements().back());
 }
 
 TEST_F(AlphabeticalTest, MovingIntoAFolderFollowsItsLastBoxAndPacksTheMenu) {
@@ -163,8 +148,7 @@ TEST_F(AlphabeticalTest, MovingIntoAFolderFollowsItsLastBoxAndPacksTheMenu) {
             "7, 1, " + std::to_string(menuPage) + ", 'F', 1, 1");
   int moved = AddNamedBox(menuPage, "moved", 2, 1);
   AddNamedBox(menuPage, "stays", 3, 1);
-  int folderPage = AddPage(folder, 1, true);
-  AddNamedBox(folderPage, "inside", 1, 1);
+  AddNamedBox(AddPage(folder, 1, true), "inside", 1, 1);
   store.GetPageDataListByAlphabeticalOrder(folder, true);
 
   EXPECT_EQ(1, Drop(moved, folder * 100000 + 1, folder, "moved"));
@@ -174,8 +158,7 @@ TEST_F(AlphabeticalTest, MovingIntoAFolderFollowsItsLastBoxAndPacksTheMenu) {
 }
 
 TEST_F(AlphabeticalTest, MovingOutOfAFolderGoesToTheEndOfTheMenuAndPacksTheFolder) {
-  int menuPage = AddPage(1, 1);
-  AddNamedBox(menuPage, "m", 4, 1);
+  AddNamedBox(AddPage(1, 1), "m", 4, 1);
   int folderPage = AddPage(30, 1, true);
   int moved = AddNamedBox(folderPage, "moved", 1, 1);
   AddNamedBox(folderPage, "second", 2, 1);
@@ -187,47 +170,38 @@ TEST_F(AlphabeticalTest, MovingOutOfAFolderGoesToTheEndOfTheMenuAndPacksTheFolde
 
   EXPECT_EQ("1/0 1:1,2", StoredPlace(moved));
   EXPECT_EQ("1,1", CellOf("id.second"));
-  EXPECT_EQ("3,1", CellOf("id.fourth"));
+  EXPECT_EQ("3,1", CellOf("id.fourth"));  // three to a folder's row
 }
 
-TEST_F(AlphabeticalTest, AStoredPageNamesItsParent) {
-  int menuPage = AddPage(1, 1);
-  int moved = AddNamedBox(menuPage, "moved");
-  int otherPage = AddPage(2, 1);
-  AddNamedBox(otherPage, "there", 1, 1);
-
-  EXPECT_EQ(1, Drop(moved, otherPage, 2, "moved"));
-  EXPECT_EQ("2/0 1:2,1", StoredPlace(moved));
-  // The lookup of a page that is not virtual leaves an empty entry behind.
-  EXPECT_EQ(1u, store.m_pageMap.count(otherPage));
-  EXPECT_EQ(0, store.m_pageMap[otherPage]);
-  EXPECT_TRUE(EngineLogs().empty());
-}
-
-TEST_F(AlphabeticalTest, AnUnknownPageMakesParentsAboveFiveFolders) {
+TEST_F(AlphabeticalTest, WithoutAVirtualPageTheTargetIsAStoredPageOrTheNamedParent) {
   int menuPage = AddPage(1, 1);
   int a = AddNamedBox(menuPage, "a");
   int b = AddNamedBox(menuPage, "b", 2, 1);
+  int c = AddNamedBox(menuPage, "c", 3, 1);
+  int d = AddNamedBox(menuPage, "d", 4, 1);
+  int otherPage = AddPage(2, 1);
+  AddNamedBox(otherPage, "there", 1, 1);
   AddNamedBox(AddPage(6, 1, true), "f", 3, 1);
   AddNamedBox(AddPage(5, 1, false), "m", 3, 1);
 
-  Drop(a, 555555, 6, "a");
-  Drop(b, 555556, 5, "b");
+  EXPECT_EQ(1, Drop(a, otherPage, 2, "a"));  // a stored page names its parent
+  // An unknown page takes the named parent, a folder when above five.
+  EXPECT_EQ(1, Drop(b, 555555, 6, "b"));
+  EXPECT_EQ(1, Drop(c, 555556, 5, "c"));
+  EXPECT_EQ(1, Drop(d, 555557, 12, "d"));  // a parent without pages gets its first
 
-  EXPECT_EQ("6/1 1:1,2", StoredPlace(a));  // 3 by 3: past the third column
-  EXPECT_EQ("5/0 1:4,1", StoredPlace(b));
+  EXPECT_EQ((std::vector<std::string>{"2/0 1:2,1", "6/1 1:1,2", "5/0 1:4,1", "12/1 1:1,1"}),
+            (std::vector<std::string>{StoredPlace(a), StoredPlace(b), StoredPlace(c),
+                                      StoredPlace(d)}));
+  // The lookup of a page that is not virtual leaves an empty entry behind.
+  EXPECT_EQ(1u, store.m_pageMap.count(otherPage));
+  EXPECT_EQ(0, store.m_pageMap[otherPage]);
+  const std::string function = "UpdateBoxDataForAlphaBeticalOrder";
   EXPECT_EQ((std::vector<EngineLog>{
-                {DLOG_ERROR, "launcher-data-manager.cpp", "UpdateBoxDataForAlphaBeticalOrder",
-                 "No page [555555]"},
-                {DLOG_ERROR, "launcher-data-manager.cpp", "UpdateBoxDataForAlphaBeticalOrder",
-                 "No page [555556]"}}),
+                {DLOG_ERROR, "launcher-data-manager.cpp", function, "No page [555555]"},
+                {DLOG_ERROR, "launcher-data-manager.cpp", function, "No page [555556]"},
+                {DLOG_ERROR, "launcher-data-manager.cpp", function, "No page [555557]"}}),
             EngineLogs());
-}
-
-TEST_F(AlphabeticalTest, MovingToAParentWithoutPagesOpensItsFirstPage) {
-  int moved = AddNamedBox(AddPage(1, 1), "moved", 2, 2);
-  EXPECT_EQ(1, Drop(moved, 999, 12, "moved"));
-  EXPECT_EQ("12/1 1:1,1", StoredPlace(moved));
 }
 
 TEST_F(AlphabeticalTest, RefusedEditsAreLoggedAndAnswerZero) {

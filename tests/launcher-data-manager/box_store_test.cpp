@@ -1,11 +1,12 @@
 // Boxes: the three statement forms, reads by id and by application id.
+// (Failures: failures_test.cpp.)
 #include "launcher-data-manager/store-test.h"
 
 namespace {
 
 class BoxStoreTest : public StoreTest {
  protected:
-  BoxStoreTest() : page(AddPage(1, 1)) {}
+  BoxStoreTest() : page(AddPage(17, 1, true)) {}
 
   // A box with every stored member set to something recognisable.
   GameBoxData Box(bool isFolder, int boxType) {
@@ -36,7 +37,7 @@ class BoxStoreTest : public StoreTest {
   int page;
 };
 
-TEST_F(BoxStoreTest, InsertUsesTheFormOfTheBox) {
+TEST_F(BoxStoreTest, InsertUsesTheFormOfTheBoxAndStoresEmptyTextsAsNull) {
   const std::string p = std::to_string(page);
   struct Case {
     const char* what;
@@ -60,23 +61,12 @@ TEST_F(BoxStoreTest, InsertUsesTheFormOfTheBox) {
     EXPECT_GT(id, 0) << c.what;
     EXPECT_EQ(id, box.boxId) << c.what;
     EXPECT_EQ(c.stored, Stored(id)) << c.what;
-  }
-}
 
-TEST_F(BoxStoreTest, EmptyTextsAreStoredAsNullInEveryForm) {
-  const bool isFolder[] = {true, false, false};
-  const int boxType[] = {0, 3, 0};
-  for (int form = 0; form < 3; ++form) {
-    GameBoxData box;
-    box.isFolder = isFolder[form];
-    box.boxType = boxType[form];
-    box.pageId = page;
-    int id = store.InsertBoxData(box);
-    EXPECT_EQ("NULL|NULL|NULL|NULL",
-              db->Value("SELECT quote(appId) || '|' || quote(name) || '|' || quote(iconPath) || "
-                        "'|' || quote(content) FROM Boxes WHERE boxId = " + std::to_string(id)))
-        << form;
-    EXPECT_EQ("", store.GetMenuBoxData(id)->name);
+    // Empty texts are stored as NULL, never as ''.
+    Row empty = c.stored;
+    for (int text : {3, 4, 11, 12}) empty[text] = "NULL";
+    box.appId = box.name = box.iconPath = box.content = "";
+    EXPECT_EQ(empty, Stored(store.InsertBoxData(box))) << c.what << ", empty texts";
   }
 }
 
@@ -115,58 +105,23 @@ TEST_F(BoxStoreTest, UpdateUsesTheFormOfTheBox) {
   }
 }
 
-TEST_F(BoxStoreTest, GetMenuBoxDataReadsEveryStoredMember) {
-  int folderPage = AddPage(17, 1, true);
+TEST_F(BoxStoreTest, GetMenuBoxDataReadsBackEveryStoredMemberAndTheParentThroughThePage) {
   GameBoxData box = Box(false, 3);
-  box.pageId = folderPage;
-  int id = store.InsertBoxData(box);
-
-  boost::shared_ptr<GameBoxData> read = store.GetMenuBoxData(id);
-  EXPECT_EQ(id, read->boxId);
-  EXPECT_FALSE(read->isFolder);
-  EXPECT_EQ(folderPage, read->pageId);
-  EXPECT_EQ(17, read->parentId);  // through the page
-  EXPECT_EQ(2, read->col);
-  EXPECT_EQ(3, read->row);
-  EXPECT_EQ("com.ex.racer", read->appId);
-  EXPECT_EQ("Racer", read->name);
-  EXPECT_TRUE(read->isPreload);
-  EXPECT_TRUE(read->isSystem);
-  EXPECT_EQ(3, read->boxType);
-  EXPECT_EQ(5, read->launchType);
-  EXPECT_EQ("/icons/racer.png", read->iconPath);
-  EXPECT_EQ("race://start", read->content);
+  store.InsertBoxData(box);
+  box.parentId = 17;
+  boost::shared_ptr<GameBoxData> read = store.GetMenuBoxData(box.boxId);
+  EXPECT_EQ(Fields(box), Fields(*read));
   EXPECT_EQ("", read->pkgId);  // never stored
-}
-
-TEST_F(BoxStoreTest, DeleteRemovesOneBoxAndLeavesAFoldersPages) {
-  GameBoxData folder = Box(true, 0);
-  int id = store.InsertBoxData(folder);
-  AddPage(id, 1, true);
-  EXPECT_TRUE(store.DeleteBoxData(id));
-  EXPECT_TRUE(store.DeleteBoxData(id));
-  EXPECT_EQ("0", db->Value("SELECT count(*) FROM Boxes"));
-  EXPECT_EQ("2", db->Value("SELECT count(*) FROM Pages"));
-}
-
-TEST_F(BoxStoreTest, CountTakesFoldersToo) {
-  AddBox(page, "a", 1, 1);
-  AddBoxSql("isFolder, pageId", "1, " + std::to_string(page));
-  AddBox(AddPage(1, 2), "b", 1, 1);
-  EXPECT_EQ(2, store.GetBoxDataCount(page));
-  EXPECT_EQ(0, store.GetBoxDataCount(page + 100));
 }
 
 // ---- Look-ups by application id
 
-TEST_F(BoxStoreTest, GetBoxIdByAppIdWritesOwnerPageAndBox) {
+TEST_F(BoxStoreTest, LookUpsByAppIdFindTheBoxAsGivenButNeverAShortcut) {
   int folderPage = AddPage(31, 1, true);
   int id = AddBox(folderPage, "com.ex.chess", 2, 1);
-  int parentId = -1, pageId = -1, boxId = -1;
+  int parentId = -1, pageId = -2, boxId = -3;
   EXPECT_TRUE(store.GetBoxIdByAppId("com.ex.chess", &parentId, &pageId, &boxId));
-  EXPECT_EQ(31, parentId);
-  EXPECT_EQ(folderPage, pageId);
-  EXPECT_EQ(id, boxId);
+  EXPECT_EQ((std::vector<int>{31, folderPage, id}), (std::vector<int>{parentId, pageId, boxId}));
 
   // An empty id is looked up as given: it finds '', never NULL.
   int empty = AddBox(page, "", 1, 1);
@@ -174,86 +129,26 @@ TEST_F(BoxStoreTest, GetBoxIdByAppIdWritesOwnerPageAndBox) {
   EXPECT_TRUE(store.GetBoxIdByAppId("", &parentId, &pageId, &boxId));
   EXPECT_EQ(empty, boxId);
   EXPECT_EQ(empty, store.GetBoxDataByAppId("")->boxId);
-}
+  EXPECT_TRUE(EngineLogs().empty());
 
-TEST_F(BoxStoreTest, LookUpsNeverFindAShortcutAndLogTheMiss) {
+  // A shortcut is a miss: the outputs stay, the record is fresh, the miss is logged.
   GameBoxData shortcut = Box(false, 3);
   store.InsertBoxData(shortcut);
-  int parentId = -1, pageId = -2, boxId = -3;
+  parentId = -1, pageId = -2, boxId = -3;
   EXPECT_FALSE(store.GetBoxIdByAppId("com.ex.racer", &parentId, &pageId, &boxId));
-  EXPECT_EQ(-1, parentId);
-  EXPECT_EQ(-2, pageId);
-  EXPECT_EQ(-3, boxId);
-  boost::shared_ptr<GameBoxData> read = store.GetBoxDataByAppId("com.ex.racer");
-  ASSERT_TRUE(read);
-  EXPECT_EQ(0, read->boxId);
+  EXPECT_EQ((std::vector<int>{-1, -2, -3}), (std::vector<int>{parentId, pageId, boxId}));
+  EXPECT_EQ(Fields(GameBoxData()), Fields(*store.GetBoxDataByAppId("com.ex.racer")));
   EXPECT_EQ((std::vector<EngineLog>{{DLOG_ERROR, "launcher-data-manager.cpp", "GetBoxDataByAppId",
                                      "cannot find box with appid[com.ex.racer]"}}),
             EngineLogs());
 }
 
-TEST_F(BoxStoreTest, GetBoxDataByAppIdReadsPlacementAndFlagsOnly) {
-  GameBoxData box = Box(false, 0);
-  box.launchType = 9;
-  int id = store.InsertBoxData(box);
-  boost::shared_ptr<GameBoxData> read = store.GetBoxDataByAppId("com.ex.racer");
-  EXPECT_EQ(id, read->boxId);
-  EXPECT_EQ(page, read->pageId);
-  EXPECT_EQ(1, read->parentId);
-  EXPECT_EQ(2, read->col);
-  EXPECT_EQ(3, read->row);
-  EXPECT_EQ("com.ex.racer", read->appId);
-  EXPECT_TRUE(read->isPreload);
-  EXPECT_TRUE(read->isSystem);
-  EXPECT_EQ(0, read->launchType);  // not read by this look-up
-  EXPECT_TRUE(EngineLogs().empty());
-}
-
-// ---- Failures
-
-TEST_F(BoxStoreTest, EveryOperationFailsAsTheLauncherExpectsWithoutItsTable) {
-  int id = AddBox(page, "a", 1, 1);
-  Break("Boxes");
-  GameBoxData box = Box(false, 0);
-  box.boxId = 88;
-
-  EXPECT_EQ(-1, store.InsertBoxData(box));
-  EXPECT_EQ(88, box.boxId);
-  EXPECT_TRUE(store.UpdateBoxData(box));
-  EXPECT_EQ(0, store.GetMenuBoxData(id)->boxId);
-  EXPECT_EQ(0, store.GetBoxDataCount(page));
-  int parentId = 7, pageId = 7, boxId = 7;
-  EXPECT_FALSE(store.GetBoxIdByAppId("a", &parentId, &pageId, &boxId));
-  EXPECT_EQ(7, boxId);
-  EXPECT_TRUE(EngineLogs().empty());
-  EXPECT_EQ("1", db->Value("SELECT count(*) FROM BoxesGone"));
-}
-
-TEST_F(BoxStoreTest, FailedDeleteLogsSqliteMessage) {
-  Break("Boxes");
-  EXPECT_FALSE(store.DeleteBoxData(1));
-  EXPECT_EQ((std::vector<EngineLog>{{DLOG_ERROR, "launcher-data-manager.cpp", "DeleteBoxData",
-                                     "sqlite error : no such table: boxes"}}),
-            EngineLogs());
-}
-
-TEST_F(BoxStoreTest, FailedLookUpLogsEachStepItTriesRegardless) {
-  Break("Boxes");
-  boost::shared_ptr<GameBoxData> read = store.GetBoxDataByAppId("com.ex.racer");
-  ASSERT_TRUE(read);
-  EXPECT_EQ(0, read->boxId);
-  const std::string sql =
-      "SELECT b.boxId, b.isFolder, p.pageId, col, row, appId, name, p.parentId, isPreload, "
-      "isSystem FROM boxes b, pages p ON b.pageId = p.pageId WHERE b.appId = $appId AND "
-      "b.boxType != 3 ";
-  EXPECT_EQ((std::vector<EngineLog>{
-                {DLOG_ERROR, "launcher-data-manager.cpp", "GetBoxDataByAppId",
-                 "sqlite error : [" + sql + ",no such table: boxes]"},
-                {DLOG_ERROR, "launcher-data-manager.cpp", "GetBoxDataByAppId",
-                 "Bind Err : com.ex.racer\n"},
-                {DLOG_ERROR, "launcher-data-manager.cpp", "GetBoxDataByAppId",
-                 "cannot find box with appid[com.ex.racer]"}}),
-            EngineLogs());
+TEST_F(BoxStoreTest, GetBoxDataByAppIdReadsPlacementNameAndFlagsOnly) {
+  GameBoxData folder = Box(true, 0);
+  int id = store.InsertBoxData(folder);
+  EXPECT_EQ((Row{std::to_string(id), "1", std::to_string(page), "17", "2", "3", "com.ex.racer",
+                 "Racer", "1", "1", "0", "0", "", ""}),  // no type, launch type, icon, content
+            Fields(*store.GetBoxDataByAppId("com.ex.racer")));
 }
 
 }  // namespace

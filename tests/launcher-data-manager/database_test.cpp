@@ -15,10 +15,6 @@ namespace {
 
 class DatabaseTest : public SimTest {
  protected:
-  std::vector<Row> Columns(SqlProbe& probe, const std::string& table) {
-    return probe.Rows("SELECT name, type, pk FROM pragma_table_info('" + table + "')");
-  }
-
   // db_util_open's answer for |path|, from a child that has given up root
   // when |asNobody|.
   static int OpenCode(const std::string& path, bool asNobody) {
@@ -42,68 +38,56 @@ class DatabaseTest : public SimTest {
   LauncherDataManager store;
 };
 
-TEST_F(DatabaseTest, OpeningCreatesTheFileWithTheSchema) {
+TEST_F(DatabaseTest, OpeningCreatesTheFileWithTheSchemaAndNothingElse) {
   store._OpenDb();
   ASSERT_NE(nullptr, store.m_db);
-  SqlProbe probe(DbPath());
-
-  EXPECT_EQ((std::vector<Row>{{"menuId", "INTEGER", "1"}, {"name", "TEXT", "0"},
-                              {"type", "INTEGER", "0"}}),
-            Columns(probe, "Menus"));
-  EXPECT_EQ((std::vector<Row>{{"pageId", "INTEGER", "1"}, {"isFolder", "INTEGER", "0"},
-                              {"parentId", "INTEGER", "0"}, {"pageNo", "INTEGER", "0"}}),
-            Columns(probe, "Pages"));
-  EXPECT_EQ((std::vector<Row>{{"boxId", "INTEGER", "1"},     {"isFolder", "INTEGER", "0"},
-                              {"pageParentId", "INTEGER", "0"}, {"pageId", "INTEGER", "0"},
-                              {"appId", "TEXT", "0"},        {"name", "TEXT", "0"},
-                              {"col", "INTEGER", "0"},       {"row", "INTEGER", "0"},
-                              {"isPreload", "INTEGER", "0"}, {"isSystem", "INTEGER", "0"},
-                              {"boxType", "INTEGER", "0"},   {"launchType", "INTEGER", "0"},
-                              {"iconPath", "TEXT", "0"},     {"content", "TEXT", "0"}}),
-            Columns(probe, "Boxes"));
-  // AUTOINCREMENT keys, and nothing else: no index, no trigger.
-  EXPECT_EQ("Boxes,Menus,Pages,sqlite_sequence",
-            probe.Value("SELECT group_concat(name) FROM (SELECT name FROM sqlite_master "
-                        "ORDER BY name)"));
+  // AUTOINCREMENT keys make sqlite_sequence; there is no index and no trigger.
+  EXPECT_EQ((std::vector<Row>{
+                {"CREATE TABLE Boxes( boxId INTEGER PRIMARY KEY AUTOINCREMENT, isFolder INTEGER, "
+                 "pageParentId INTEGER, pageId INTEGER, appId TEXT, name TEXT, col INTEGER, row "
+                 "INTEGER, isPreload INTEGER, isSystem INTEGER, boxType INTEGER, launchType "
+                 "INTEGER, iconPath TEXT, content TEXT )"},
+                {"CREATE TABLE Menus( menuId INTEGER PRIMARY KEY AUTOINCREMENT, name TEXT, type "
+                 "INTEGER )"},
+                {"CREATE TABLE Pages( pageId INTEGER PRIMARY KEY AUTOINCREMENT, isFolder INTEGER, "
+                 "parentId INTEGER, pageNo INTEGER )"},
+                {"CREATE TABLE sqlite_sequence(name,seq)"}}),
+            SqlProbe(DbPath()).Rows("SELECT sql FROM sqlite_master ORDER BY name"));
   EXPECT_TRUE(EngineLogs().empty());
 }
 
 TEST_F(DatabaseTest, JournalIsPersistent) {
   store._OpenDb();
-  sqlite3_stmt* stmt = NULL;
-  ASSERT_EQ(SQLITE_OK, sqlite3_prepare_v2(store.m_db, "PRAGMA journal_mode", -1, &stmt, NULL));
-  ASSERT_EQ(SQLITE_ROW, sqlite3_step(stmt));
-  EXPECT_STREQ("persist", reinterpret_cast<const char*>(sqlite3_column_text(stmt, 0)));
-  sqlite3_finalize(stmt);
+  std::string mode;
+  sqlite3_exec(
+      store.m_db, "PRAGMA journal_mode",
+      [](void* out, int, char** values, char**) {
+        *static_cast<std::string*>(out) = values[0];
+        return 0;
+      },
+      &mode, NULL);
+  EXPECT_EQ("persist", mode);
 
   // A persistent journal stays behind after a write.
   ASSERT_TRUE(store.BeginTransaction());
   ASSERT_EQ(SQLITE_OK, sqlite3_exec(store.m_db, "INSERT INTO menus(type) VALUES(0)", 0, 0, 0));
   ASSERT_TRUE(store.CommitTransaction());
-  struct stat info;
-  EXPECT_EQ(0, stat((DbPath() + "-journal").c_str(), &info));
+  EXPECT_EQ(0, access((DbPath() + "-journal").c_str(), F_OK));
 }
 
-TEST_F(DatabaseTest, OpeningAgainKeepsEveryRow) {
+TEST_F(DatabaseTest, OpeningAgainKeepsEveryRowAndCloseReleasesTheConnection) {
   store._OpenDb();
-  {
-    SqlProbe probe(DbPath());
-    probe.Exec("INSERT INTO Menus(name, type) VALUES('Apps', 0);"
-               "INSERT INTO Pages(isFolder, parentId, pageNo) VALUES(0, 1, 1);"
-               "INSERT INTO Boxes(isFolder, pageId, appId, col, row) VALUES(0, 1, 'a', 1, 1);");
-  }
+  SqlProbe(DbPath()).Exec(
+      "INSERT INTO Menus(name, type) VALUES('Apps', 0);"
+      "INSERT INTO Pages(isFolder, parentId, pageNo) VALUES(0, 1, 1);"
+      "INSERT INTO Boxes(isFolder, pageId, appId, col, row) VALUES(0, 1, 'a', 1, 1);");
   store._OpenDb();
   LauncherDataManager second;
   second._OpenDb();
+  EXPECT_EQ("1 1 a", SqlProbe(DbPath()).Value(
+                         "SELECT (SELECT count(*) FROM Menus) || ' ' || (SELECT count(*) FROM "
+                         "Pages) || ' ' || (SELECT group_concat(appId) FROM Boxes)"));
 
-  SqlProbe probe(DbPath());
-  EXPECT_EQ("1", probe.Value("SELECT count(*) FROM Menus"));
-  EXPECT_EQ("1", probe.Value("SELECT count(*) FROM Pages"));
-  EXPECT_EQ("a", probe.Value("SELECT appId FROM Boxes"));
-}
-
-TEST_F(DatabaseTest, CloseReleasesTheConnection) {
-  store._OpenDb();
   EXPECT_EQ(SQLITE_OK, store._CloseDb());
   EXPECT_EQ(nullptr, store.m_db);
   EXPECT_EQ(SQLITE_OK, store._CloseDb());
@@ -137,15 +121,10 @@ TEST_F(DatabaseTest, WriteLockHeldElsewhereFailsWritesAtOnce) {
 
 // ---- Transactions
 
-TEST_F(DatabaseTest, CommitWithoutTransactionFails) {
+TEST_F(DatabaseTest, CommitKeepsRollbackDiscardsAndNeitherRunsOutsideATransaction) {
   store._OpenDb();
   EXPECT_FALSE(store.CommitTransaction());
   EXPECT_FALSE(store.RollbackTransaction());
-  EXPECT_TRUE(EngineLogs().empty());
-}
-
-TEST_F(DatabaseTest, CommitKeepsAndRollbackDiscards) {
-  store._OpenDb();
   ASSERT_TRUE(store.BeginTransaction());
   EXPECT_FALSE(store.BeginTransaction());  // no nesting
   sqlite3_exec(store.m_db, "INSERT INTO menus(name, type) VALUES('kept', 0)", 0, 0, 0);
@@ -155,13 +134,13 @@ TEST_F(DatabaseTest, CommitKeepsAndRollbackDiscards) {
   sqlite3_exec(store.m_db, "INSERT INTO menus(name, type) VALUES('dropped', 0)", 0, 0, 0);
   ASSERT_TRUE(store.RollbackTransaction());
 
-  SqlProbe probe(DbPath());
-  EXPECT_EQ((std::vector<Row>{{"kept"}}), probe.Rows("SELECT name FROM Menus"));
+  EXPECT_EQ((std::vector<Row>{{"kept"}}), SqlProbe(DbPath()).Rows("SELECT name FROM Menus"));
+  EXPECT_TRUE(EngineLogs().empty());
 }
 
 // ---- Open failures
 
-TEST_F(DatabaseTest, OpenRefusesNullArguments) {
+TEST_F(DatabaseTest, OpenRefusesNullArgumentsAndPassesFlagsThrough) {
   sqlite3* db = reinterpret_cast<sqlite3*>(&store);  // any value: it must stay untouched
   sqlite3* const untouched = db;
   EXPECT_EQ(SQLITE_ERROR, db_util_open(NULL, &db, 0));
@@ -170,14 +149,11 @@ TEST_F(DatabaseTest, OpenRefusesNullArguments) {
   EXPECT_EQ(SQLITE_ERROR, db_util_open_with_options(DbPath().c_str(), NULL, 0, NULL));
   EXPECT_EQ(untouched, db);
   EXPECT_NE(0, access(DbPath().c_str(), F_OK));
-}
 
-TEST_F(DatabaseTest, OpenWithOptionsPassesFlagsThrough) {
-  sqlite3* db = NULL;
+  db = NULL;
   EXPECT_EQ(SQLITE_CANTOPEN, db_util_open_with_options(DbPath().c_str(), &db,
                                                        SQLITE_OPEN_READONLY, NULL));
   sqlite3_close(db);
-  db = NULL;
   ASSERT_EQ(SQLITE_OK, db_util_open_with_options(
                            DbPath().c_str(), &db, SQLITE_OPEN_READWRITE | SQLITE_OPEN_CREATE, NULL));
   EXPECT_EQ(SQLITE_OK, db_util_close(db));
@@ -203,25 +179,19 @@ TEST_F(DatabaseTest, FailedOpenIsLoggedAndCreatesNothing) {
   device.ClearLogs();
 
   store._OpenDb();
-
-  std::vector<EngineLog> logs = EngineLogs();
-  ASSERT_EQ(1u, logs.size());
-  EXPECT_EQ((EngineLog{DLOG_ERROR, "launcher-data-manager.cpp", "_OpenDb",
-                       "sqlite error : [14]"}),
-            logs[0]);
+  EXPECT_EQ((std::vector<EngineLog>{
+                {DLOG_ERROR, "launcher-data-manager.cpp", "_OpenDb", "sqlite error : [14]"}}),
+            EngineLogs());
 }
 
 TEST_F(DatabaseTest, FailingSchemaIsLoggedWithSqliteMessage) {
   std::ofstream(DbPath()) << std::string(4096, 'x');
 
   store._OpenDb();
-
-  ASSERT_NE(nullptr, store.m_db);  // the connection stays open
-  std::vector<EngineLog> logs = EngineLogs();
-  ASSERT_EQ(1u, logs.size());
-  EXPECT_EQ((EngineLog{DLOG_ERROR, "launcher-data-manager.cpp", "_CreateTables",
-                       "SQL error(26) : file is not a database"}),
-            logs[0]);
+  EXPECT_NE(nullptr, store.m_db);  // the connection stays open
+  EXPECT_EQ((std::vector<EngineLog>{{DLOG_ERROR, "launcher-data-manager.cpp", "_CreateTables",
+                                     "SQL error(26) : file is not a database"}}),
+            EngineLogs());
 }
 
 }  // namespace

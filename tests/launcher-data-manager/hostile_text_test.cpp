@@ -16,31 +16,20 @@ const std::string kHostileTexts[] = {
     "line one\nline two\r\nthree\ttabbed",
 };
 
-class HostileTextTest : public StoreTest, public ::testing::WithParamInterface<std::string> {
- protected:
-  void ExpectTablesIntact() {
-    EXPECT_EQ("Boxes,Menus,Pages,sqlite_sequence",
-              db->Value("SELECT group_concat(name) FROM (SELECT name FROM sqlite_master "
-                        "ORDER BY name)"));
-  }
-};
+class HostileTextTest : public StoreTest, public ::testing::WithParamInterface<std::string> {};
 
-TEST_P(HostileTextTest, MenuNameRoundTrips) {
+TEST_P(HostileTextTest, EveryTextParameterRoundTripsAndTheTablesStayIntact) {
   const std::string& text = GetParam();
   GameViewData menu;
   menu.name = text;
-  int id = store.InsertMenuData(menu);
-  EXPECT_EQ(text, store.GetMenuData(id)->name);
+  int menuId = store.InsertMenuData(menu);
+  EXPECT_EQ(text, store.GetMenuData(menuId)->name);
   menu.name = text + text;
   EXPECT_TRUE(store.UpdateMenuData(menu));
   EXPECT_EQ(text + text, store.GetMenuDataList()[0]->name);
-  EXPECT_EQ("1", db->Value("SELECT count(*) FROM Menus"));
-  ExpectTablesIntact();
-}
 
-TEST_P(HostileTextTest, ShortcutTextsRoundTrip) {
-  const std::string& text = GetParam();
-  int page = AddPage(1, 1);
+  // A shortcut carries all four texts.
+  int page = AddPage(menuId, 1);
   GameBoxData box;
   box.pageId = page;
   box.boxType = 3;
@@ -48,14 +37,9 @@ TEST_P(HostileTextTest, ShortcutTextsRoundTrip) {
   box.name = text + "n";
   box.iconPath = text + "i";
   box.content = text + "c";
-  int id = store.InsertBoxData(box);
-
-  boost::shared_ptr<GameBoxData> read = store.GetMenuBoxData(id);
-  EXPECT_EQ(text + "a", read->appId);
-  EXPECT_EQ(text + "n", read->name);
-  EXPECT_EQ(text + "i", read->iconPath);
-  EXPECT_EQ(text + "c", read->content);
-
+  boost::shared_ptr<GameBoxData> read = store.GetMenuBoxData(store.InsertBoxData(box));
+  EXPECT_EQ((Row{text + "a", text + "n", text + "i", text + "c"}),
+            (Row{read->appId, read->name, read->iconPath, read->content}));
   box.name = text;
   box.content = "";
   store.UpdateBoxData(box);
@@ -64,35 +48,32 @@ TEST_P(HostileTextTest, ShortcutTextsRoundTrip) {
   EXPECT_EQ(text, listed[0]->name);
   EXPECT_EQ("", listed[0]->content);
   EXPECT_EQ(text + "i", store.GetBoxDataList(page)[0]->iconPath);
-  ExpectTablesIntact();
-}
 
-TEST_P(HostileTextTest, ApplicationIdsAreFoundAsGiven) {
-  const std::string& text = GetParam();
-  int page = AddPage(1, 1);
+  // An application is found by its id as given; a folder keeps its name.
   GameBoxData app;
   app.pageId = page;
   app.appId = text;
-  int id = store.InsertBoxData(app);
+  int appBox = store.InsertBoxData(app);
   GameBoxData folder;
   folder.isFolder = true;
   folder.pageId = page;
   folder.name = text;
-  int folderId = store.InsertBoxData(folder);
-
-  EXPECT_EQ(id, store.GetBoxDataByAppId(text)->boxId);
+  int folderBox = store.InsertBoxData(folder);
+  EXPECT_EQ(appBox, store.GetBoxDataByAppId(text)->boxId);
   int parentId = 0, pageId = 0, boxId = 0;
   EXPECT_TRUE(store.GetBoxIdByAppId(text, &parentId, &pageId, &boxId));
-  EXPECT_EQ(id, boxId);
-  EXPECT_EQ(text, store.GetMenuBoxData(folderId)->name);
+  EXPECT_EQ(appBox, boxId);
+  EXPECT_EQ(text, store.GetMenuBoxData(folderBox)->name);
   EXPECT_EQ(text, store.GetBoxDataListByDownload(1, false)[0]->appId);
 
   // A near miss finds nothing, and the id is logged as it is.
   store.GetBoxDataByAppId(text + "?");
-  ASSERT_EQ(1u, EngineLogs().size());
-  EXPECT_EQ("cannot find box with appid[" + text + "?]", EngineLogs()[0].message);
-  EXPECT_EQ("2", db->Value("SELECT count(*) FROM Boxes"));
-  ExpectTablesIntact();
+  EXPECT_EQ(std::vector<std::string>{"E cannot find box with appid[" + text + "?]"},
+            EngineMessages());
+  EXPECT_EQ("1 1 3", Counts());
+  EXPECT_EQ("Boxes,Menus,Pages,sqlite_sequence",
+            db->Value("SELECT group_concat(name) FROM (SELECT name FROM sqlite_master "
+                      "ORDER BY name)"));
 }
 
 INSTANTIATE_TEST_SUITE_P(Texts, HostileTextTest, ::testing::ValuesIn(kHostileTexts),

@@ -9,46 +9,42 @@ class PackingTest : public StoreTest {
   std::vector<std::string> Layout(int parentId, bool isFolder) {
     std::vector<std::string> layout;
     for (const Row& row : db->Rows(
-             "SELECT b.appId || '@' || p.pageNo || ':' || b.col || ',' || b.row FROM Boxes b, "
-             "Pages p ON p.pageId = b.pageId WHERE p.parentId = " + std::to_string(parentId) +
-             " AND p.isFolder = " + std::to_string(isFolder) + " ORDER BY p.pageNo, b.row, b.col")) {
+             "SELECT coalesce(b.appId, b.name) || '@' || p.pageNo || ':' || b.col || ',' || b.row "
+             "FROM Boxes b, Pages p ON p.pageId = b.pageId WHERE p.parentId = " +
+             std::to_string(parentId) + " AND p.isFolder = " + std::to_string(isFolder) +
+             " ORDER BY p.pageNo, b.row, b.col")) {
       layout.push_back(row[0]);
     }
     return layout;
   }
 
+  // "pageId:pageNo" of each page of the parent, by pageId.
   std::string PageNumbers(int parentId, bool isFolder) {
-    return db->Value("SELECT coalesce(group_concat(pageId || ':' || pageNo, ' '), '') FROM (SELECT * FROM Pages "
-                     "WHERE parentId = " + std::to_string(parentId) + " AND isFolder = " +
-                     std::to_string(isFolder) + " ORDER BY pageId)");
-  }
-
-  std::string Dump() {
-    std::string dump;
-    for (const Row& row : db->Rows("SELECT * FROM Pages ORDER BY pageId")) {
-      for (const std::string& column : row) dump += column + "|";
-    }
-    for (const Row& row : db->Rows("SELECT * FROM Boxes ORDER BY boxId")) {
-      for (const std::string& column : row) dump += column + "|";
-    }
-    return dump;
+    return db->Value("SELECT coalesce(group_concat(pageId || ':' || pageNo, ' '), '') FROM (SELECT "
+                     "* FROM Pages WHERE parentId = " + std::to_string(parentId) +
+                     " AND isFolder = " + std::to_string(isFolder) + " ORDER BY pageId)");
   }
 };
 
 // ---- Page by page
 
-TEST_F(PackingTest, ReorderPacksEachPageInPlaceAndRenumbers) {
+TEST_F(PackingTest, ReorderPacksEachPageInPlaceAndRenumbersOrKeepsEmptyPagesWithoutBoxes) {
   int first = AddPage(1, 4);
   AddPage(1, 6);  // empty: goes
   int second = AddPage(1, 9);
   AddBox(first, "a", 3, 2);
   AddBox(first, "b", 1, 5);
   AddBox(second, "c", 4, 4);
+  int emptyFirst = AddPage(2, 5);
+  int emptySecond = AddPage(2, 8);
 
   store._ReorderData(1, false);
+  store._ReorderData(2, false);
 
   EXPECT_EQ((std::vector<std::string>{"a@1:1,1", "b@1:2,1", "c@2:1,1"}), Layout(1, false));
   EXPECT_EQ(std::to_string(first) + ":1 " + std::to_string(second) + ":2", PageNumbers(1, false));
+  EXPECT_EQ(std::to_string(emptyFirst) + ":1 " + std::to_string(emptySecond) + ":2",
+            PageNumbers(2, false));
 }
 
 TEST_F(PackingTest, ReorderLaysAFolderOutThreeByThree) {
@@ -57,11 +53,10 @@ TEST_F(PackingTest, ReorderLaysAFolderOutThreeByThree) {
 
   store._ReorderData(42, true);
 
-  EXPECT_EQ("1,1", CellOf("f0"));
-  EXPECT_EQ("3,1", CellOf("f2"));
-  EXPECT_EQ("1,2", CellOf("f3"));
-  EXPECT_EQ("3,3", CellOf("f8"));
-  EXPECT_EQ("10,7", CellOf("f9"));  // past the last row: keeps its cell
+  EXPECT_EQ((std::vector<std::string>{"f0@1:1,1", "f1@1:2,1", "f2@1:3,1", "f3@1:1,2", "f4@1:2,2",
+                                      "f5@1:3,2", "f6@1:1,3", "f7@1:2,3", "f8@1:3,3",
+                                      "f9@1:10,7"}),  // past the last row: keeps its cell
+            Layout(42, true));
 }
 
 TEST_F(PackingTest, ReorderStopsAMenuPageAtRow40000) {
@@ -76,13 +71,6 @@ TEST_F(PackingTest, ReorderStopsAMenuPageAtRow40000) {
   EXPECT_EQ("1,1", CellOf("app1"));
   EXPECT_EQ("4,40000", CellOf("app160000"));
   EXPECT_EQ("1,90000", CellOf("app0"));
-}
-
-TEST_F(PackingTest, ReorderKeepsEmptyPagesWhenThereIsNoBoxAtAll) {
-  AddPage(1, 5);
-  AddPage(1, 8);
-  store._ReorderData(1, false);
-  EXPECT_EQ("1:1 2:2", PageNumbers(1, false));
 }
 
 // ---- Reflowed across pages
@@ -101,32 +89,26 @@ TEST_F(PackingTest, ReorderWithoutSpaceUsesTheMenuGridForFoldersAndDropsEmptyPag
   EXPECT_EQ("", PageNumbers(3, false));  // no box at all: every page goes
 }
 
-TEST_F(PackingTest, ReorderWithoutSpaceFillsRowsUpTo40002) {
+TEST_F(PackingTest, ReorderWithoutSpaceFillsRowsUpTo40002ThenTheNextPageOrLeavesTheRest) {
   int first = AddPage(1, 1);
   int second = AddPage(1, 2);
   FillPage(first, 160009);
+  // Menu 2 has a single page, so its last box has nowhere to go.
+  FillPage(AddPage(2, 1), 160009, "only");
+  db->Exec("UPDATE Boxes SET col = 3, row = 50000 WHERE appId = 'only160008'");
 
   ASSERT_TRUE(store.BeginTransaction());
   store._ReorderDataWithoutSpace(1, false);
+  store._ReorderDataWithoutSpace(2, false);
   ASSERT_TRUE(store.CommitTransaction());
 
   EXPECT_EQ("4,40002", CellOf("app160007"));
   EXPECT_EQ(std::to_string(second),
             db->Value("SELECT pageId FROM Boxes WHERE appId = 'app160008'"));
   EXPECT_EQ("1,1", CellOf("app160008"));
-}
-
-TEST_F(PackingTest, ReorderWithoutSpaceLeavesBoxesInPlaceWhenPagesRunOut) {
-  int page = AddPage(1, 1);
-  FillPage(page, 160009);
-  db->Exec("UPDATE Boxes SET col = 3, row = 50000 WHERE appId = 'app160008'");
-
-  ASSERT_TRUE(store.BeginTransaction());
-  store._ReorderDataWithoutSpace(1, false);
-  ASSERT_TRUE(store.CommitTransaction());
-
-  EXPECT_EQ("3,50000", CellOf("app160008"));
-  EXPECT_EQ("1", db->Value("SELECT count(*) FROM Pages"));
+  EXPECT_EQ(std::to_string(first), db->Value("SELECT pageId FROM Boxes WHERE appId = 'app0'"));
+  EXPECT_EQ("3,50000", CellOf("only160008"));
+  EXPECT_EQ("4,40002", CellOf("only160007"));
 }
 
 // ---- The whole layout
@@ -150,10 +132,11 @@ TEST_F(PackingTest, RearrangeRenumbersDropsEmptySurplusPagesAndPacks) {
   EXPECT_EQ(std::to_string(onlyPage) + ":1", PageNumbers(empty, false));
 }
 
-TEST_F(PackingTest, RearrangePacksFolderPagesFourWideAroundNestedFolders) {
+TEST_F(PackingTest, RearrangePacksFolderPagesFourWideInOneTransactionAndASecondPassChangesNothing) {
   int apps = AddMenu("Apps");
   int page = AddPage(apps, 1);
-  int folder = AddBoxSql("isFolder, pageId, name, col, row", "1, " + std::to_string(page) + ", 'F', 3, 3");
+  int folder = AddBoxSql("isFolder, pageId, name, isSystem, col, row",
+                         "1, " + std::to_string(page) + ", 'F', 1, 3, 3");
   int folderPage = AddPage(folder, 2, true);
   AddPage(folder, 5, true);  // empty and not the only one: goes
   AddBox(folderPage, "x", 3, 1);
@@ -161,36 +144,28 @@ TEST_F(PackingTest, RearrangePacksFolderPagesFourWideAroundNestedFolders) {
   AddBox(folderPage, "y", 1, 3);
   AddBox(folderPage, "z", 4, 3);
   AddBox(folderPage, "w", 2, 4);
+  int lone = AddBoxSql("isFolder, pageId, name, col, row",
+                       "1, " + std::to_string(page) + ", 'G', 4, 4");
+  int lonePage = AddPage(lone, 1, true);  // empty, but the folder's only page: stays
 
   store.RearrangeAppsPosition();
 
-  EXPECT_EQ("1,1", db->Value("SELECT col || ',' || row FROM Boxes WHERE name = 'F'"));
-  EXPECT_EQ("1,1", CellOf("x"));
-  EXPECT_EQ("2,2", db->Value("SELECT col || ',' || row FROM Boxes WHERE name = 'nested'"));
-  EXPECT_EQ("2,1", CellOf("y"));
-  EXPECT_EQ("3,1", CellOf("z"));
-  EXPECT_EQ("4,1", CellOf("w"));
-  EXPECT_EQ(std::to_string(folderPage) + ":2", PageNumbers(folder, true));  // not renumbered
-}
-
-TEST_F(PackingTest, RearrangeRunsInOneTransactionAndASecondPassChangesNothing) {
-  int apps = AddMenu("Apps");
-  int page = AddPage(apps, 2);
-  AddPage(apps, 3);
-  AddBox(page, "a", 3, 3);
-  int folder = AddBoxSql("isFolder, pageId, name, isSystem, col, row",
-                         "1, " + std::to_string(page) + ", 'F', 1, 1, 5");
-  AddBox(AddPage(folder, 1, true), "b", 2, 2);
-
-  store.RearrangeAppsPosition();
+  EXPECT_EQ((std::vector<std::string>{"F@1:1,1", "G@1:2,1"}), Layout(apps, false));
+  EXPECT_EQ(std::to_string(lonePage) + ":1", PageNumbers(lone, true));
+  // A nested folder keeps its cell and takes none; the page is not renumbered.
+  EXPECT_EQ((std::vector<std::string>{"x@2:1,1", "y@2:2,1", "z@2:3,1", "w@2:4,1", "nested@2:2,2"}),
+            Layout(folder, true));
+  EXPECT_EQ(std::to_string(folderPage) + ":2", PageNumbers(folder, true));
   std::vector<std::string> statements = TakeStatements();
   ASSERT_GE(statements.size(), 2u);
   EXPECT_EQ("BEGIN IMMEDIATE TRANSACTION", statements.front());
   EXPECT_EQ("COMMIT TRANSACTION", statements.back());
 
-  std::string once = Dump();
+  const std::vector<Row> pages = db->Rows("SELECT * FROM Pages ORDER BY pageId");
+  const std::vector<Row> boxes = db->Rows("SELECT * FROM Boxes ORDER BY boxId");
   store.RearrangeAppsPosition();
-  EXPECT_EQ(once, Dump());
+  EXPECT_EQ(pages, db->Rows("SELECT * FROM Pages ORDER BY pageId"));
+  EXPECT_EQ(boxes, db->Rows("SELECT * FROM Boxes ORDER BY boxId"));
 }
 
 TEST_F(PackingTest, ATenThousandBoxLayoutRearrangesAndListsAlphabetically) {

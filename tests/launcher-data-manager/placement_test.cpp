@@ -81,34 +81,29 @@ TEST_F(PlacementTest, NextAppGoesAfterTheLastBoxOfTheLastPage) {
   EXPECT_EQ("5:4,0", PlaceOf("next"));
 }
 
-TEST_F(PlacementTest, AFullPageOfFortyThousandRowsWrapsToANewPage) {
+TEST_F(PlacementTest, AFullPageWrapsAfterRow40000AndForADeactivatedAppAfterRow40002) {
   FillPage(AddPage(apps, 1), 160000);
   bool pageAdded = false;
   store.InsertBoxData("next", pageAdded);
   EXPECT_TRUE(pageAdded);
   EXPECT_EQ("2:1,1", PlaceOf("next"));
   EXPECT_EQ("4,40000", CellOf("app159999"));  // the page was full
-}
 
-// ---- Deactivated applications: any menu, and two rows more before a wrap
-
-TEST_F(PlacementTest, DeactivatedAppGoesToTheEndOfTheGivenMenu) {
+  // A deactivated application goes to the menu it is given, opening its first page.
   int other = AddMenu("Other");
-  EXPECT_GT(store.InsertBoxDataForDeactivatedApp(other, "a"), 0);
-  EXPECT_EQ((std::vector<Row>{{"0", std::to_string(other), "1"}}),
-            db->Rows("SELECT isFolder, parentId, pageNo FROM Pages"));
-  store.InsertBoxDataForDeactivatedApp(other, "b");
-  EXPECT_EQ("1:2,1", PlaceOf("b"));
-}
-
-TEST_F(PlacementTest, DeactivatedAppWrapsOnlyAfterRow40002) {
-  int page = AddPage(apps, 1);
-  FillPage(page, 160000);
-  store.InsertBoxDataForDeactivatedApp(apps, "row 40001");
+  EXPECT_GT(store.InsertBoxDataForDeactivatedApp(other, "first"), 0);
+  EXPECT_EQ((std::vector<Row>{{"0", std::to_string(other), "1", "1,1"}}),
+            db->Rows("SELECT p.isFolder, p.parentId, p.pageNo, b.col || ',' || b.row FROM Pages "
+                     "p, Boxes b ON b.pageId = p.pageId WHERE b.appId = 'first'"));
+  int page = std::stoi(db->Value("SELECT pageId FROM Boxes WHERE appId = 'first'"));
+  FillPage(page, 160000, "other");
+  store.InsertBoxDataForDeactivatedApp(other, "row 40001");
   EXPECT_EQ("1:1,40001", PlaceOf("row 40001"));
-
+  AddBox(page, "end of 40001", 4, 40001);
+  store.InsertBoxDataForDeactivatedApp(other, "row 40002");
+  EXPECT_EQ("1:1,40002", PlaceOf("row 40002"));
   AddBox(page, "last", 4, 40002);
-  store.InsertBoxDataForDeactivatedApp(apps, "wrapped");
+  store.InsertBoxDataForDeactivatedApp(other, "wrapped");
   EXPECT_EQ("2:1,1", PlaceOf("wrapped"));
 }
 

@@ -9,29 +9,22 @@ namespace {
 class SqlTextTest : public StoreTest {};
 
 TEST_F(SqlTextTest, EachOperationRunsItsOwnText) {
+  // Each insert writes the new id into its record, which the update after it
+  // then names.
   int page = AddPage(1, 1);
   GameViewData menu;
-  menu.menuId = 2;
   menu.type = 0;
   GamePageData pageRecord;
-  pageRecord.pageId = 4;
   pageRecord.isFolder = true;
   pageRecord.parentId = 12;
   pageRecord.pageNo = 3;
-  GameBoxData folder;
-  folder.isFolder = true;
-  folder.boxId = 12;
+  GameBoxData folder, shortcut, app;
+  folder.isFolder = folder.isSystem = true;
   folder.pageId = 3;
   folder.col = 2;
   folder.row = 1;
-  folder.isSystem = true;
-  GameBoxData shortcut;
   shortcut.boxType = 3;
-  shortcut.boxId = 7;
-  shortcut.pageId = page;
-  GameBoxData app;
-  app.boxId = 8;
-  app.pageId = page;
+  shortcut.pageId = app.pageId = page;
   app.col = 1;
   app.row = 2;
   app.isPreload = true;

@@ -51,6 +51,11 @@ std::string StoreTest::CellOf(const std::string& appId) {
   return db->Value("SELECT col || ',' || row FROM Boxes WHERE appId = '" + appId + "'");
 }
 
+std::string StoreTest::Counts() {
+  return db->Value("SELECT (SELECT count(*) FROM Menus) || ' ' || (SELECT count(*) FROM Pages) || "
+                   "' ' || (SELECT count(*) FROM Boxes)");
+}
+
 void StoreTest::Break(const std::string& table) {
   db->Exec("ALTER TABLE " + table + " RENAME TO " + table + "Gone");
   // The store's connection notices the change at its next read of the schema;
@@ -70,4 +75,23 @@ std::vector<std::pair<int, int> > StoreTest::Cells(
   std::vector<std::pair<int, int> > cells;
   for (size_t i = 0; i < boxes.size(); ++i) cells.push_back(std::make_pair(boxes[i]->col, boxes[i]->row));
   return cells;
+}
+
+Row StoreTest::Fields(const GameBoxData& b) {
+  const int numbers[] = {b.boxId, b.isFolder, b.pageId, b.parentId, b.col, b.row};
+  Row row;
+  for (int n : numbers) row.push_back(std::to_string(n));
+  row.insert(row.end(), {b.appId, b.name, std::to_string(b.isPreload), std::to_string(b.isSystem),
+                         std::to_string(b.boxType), std::to_string(b.launchType), b.iconPath,
+                         b.content});
+  return row;
+}
+
+Row StoreTest::Fields(const GamePageData& p) {
+  return {std::to_string(p.pageId), std::to_string(p.isFolder), std::to_string(p.parentId),
+          std::to_string(p.pageNo)};
+}
+
+Row StoreTest::Fields(const GameViewData& m) {
+  return {std::to_string(m.menuId), m.name, std::to_string(m.type)};
 }

@@ -29,6 +29,8 @@ class StoreTest : public SimTest {
   void FillPage(int pageId, int count, const std::string& prefix = "app");
   // "col,row" of the box of |appId|, or "" when it has none.
   std::string CellOf(const std::string& appId);
+  // How many rows Menus, Pages and Boxes hold: "1 2 5".
+  std::string Counts();
 
   // Renames |table| away, so that every statement naming it stops compiling.
   void Break(const std::string& table);
@@ -39,6 +41,21 @@ class StoreTest : public SimTest {
   // (col,row) pairs of |boxes|, for compact layout checks.
   static std::vector<std::pair<int, int> > Cells(
       const std::vector<boost::shared_ptr<GameBoxData> >& boxes);
+
+  // What a read fills in, as text, so that a whole record is checked at once.
+  // A box: boxId, isFolder, pageId, parentId, col, row, appId, name,
+  // isPreload, isSystem, boxType, launchType, iconPath, content.
+  static Row Fields(const GameBoxData& box);
+  // A page: pageId, isFolder, parentId, pageNo.
+  static Row Fields(const GamePageData& page);
+  // A menu: menuId, name, type.
+  static Row Fields(const GameViewData& menu);
+  template <class Record>
+  static std::vector<Row> Fields(const std::vector<boost::shared_ptr<Record> >& records) {
+    std::vector<Row> rows;
+    for (const auto& record : records) rows.push_back(Fields(*record));
+    return rows;
+  }
 
   LauncherDataManager store;
   std::unique_ptr<SqlProbe> db;

@@ -19,6 +19,8 @@ class AppInfoTest : public PackageManagerTest {
   }
 };
 
+const char kIcon[] = "/opt/usr/share/icons/default/small/com.ex.racer.png";
+
 TEST_F(AppInfoTest, ReadingFillsTheRecordAndCachesThatVeryRecord) {
   boost::shared_ptr<GameBoxData> box = NewBox();
   box->boxId = 7;
@@ -26,20 +28,9 @@ TEST_F(AppInfoTest, ReadingFillsTheRecordAndCachesThatVeryRecord) {
   box->appSize = 99;
 
   ASSERT_TRUE(manager._GetAppInfo("com.ex.racer", box));
-  EXPECT_EQ("com.ex.racer", box->pkgId);
-  EXPECT_EQ("com.ex.racer", box->appId);
-  EXPECT_EQ("capp", box->pkgType);
-  EXPECT_EQ("Racer", box->name);
-  EXPECT_EQ("/opt/usr/share/icons/default/small/com.ex.racer.png", box->iconPath);
-  EXPECT_FALSE(box->isNoDisplay);
-  EXPECT_TRUE(box->isEnabled);
-  EXPECT_FALSE(box->isRemovable);
-  EXPECT_TRUE(box->isPreload);
-  EXPECT_FALSE(box->isSystem);
-  EXPECT_EQ(0, box->appSize);
-  EXPECT_FALSE(box->isMdmRestricted);
-  EXPECT_EQ(7, box->boxId);  // not the reading's business
-  EXPECT_TRUE(box->isNewBadge && box->isUpdatable && box->isSelected);
+  EXPECT_EQ((Ids{"com.ex.racer", "com.ex.racer", "capp", "Racer", kIcon, "010100 0"}), Facts(*box));
+  // Not the reading's business:
+  EXPECT_TRUE(box->boxId == 7 && box->isNewBadge && box->isUpdatable && box->isSelected);
 
   ASSERT_EQ(1u, manager.m_appInfoCache.size());
   EXPECT_EQ(box.get(), manager.m_appInfoCache["com.ex.racer"].get());
@@ -52,7 +43,7 @@ TEST_F(AppInfoTest, ReadingFillsTheRecordAndCachesThatVeryRecord) {
 }
 
 TEST_F(AppInfoTest, WhatTheDeviceReportsShapesTheRecord) {
-  const std::string icon = "/opt/usr/share/icons/default/small/com.ex.racer.png";
+  const std::string icon = kIcon;
   struct {
     const char* name;
     std::function<void(sim::App&)> change;
@@ -103,32 +94,30 @@ TEST_F(AppInfoTest, EveryFailingCallIsLoggedAndReportedAsFalse) {
   const std::string failed = "E AppId[com.ex.racer] failed to get pkginfo";
   const int io = TIZEN_ERROR_IO_ERROR;  // the same -5 for both managers
   const int db = APP_MANAGER_ERROR_DB_FAILED;
-  struct {
+  struct Case {
     const char* call;
     int error;
-    std::vector<std::string> logs;
-  } cases[] = {
+    Ids logs;
+  };
+  std::vector<Case> cases = {
       {"app_info_create", db, {"E app_info_create return [-17891325]"}},
       {"app_info_get_app_id", io,
        {"E app_info_get_app_id return [-5]", "E AppId[(null)] failed to get pkginfo"}},
-      {"app_info_is_nodisplay", io, {"E app_info_is_nodisplay return [-5]", failed}},
-      {"app_info_get_package", io, {"E app_info_get_package return [-5]", failed}},
-      {"app_info_get_icon", io, {"E app_info_get_icon return [-5]", failed}},
-      {"app_info_get_label", io, {"E app_info_get_label return [-5]", failed}},
       // The enabled read reports itself with the label's text.
       {"app_info_is_enabled", db, {"E app_info_get_label return [-17891325]", failed}},
-      {"app_info_get_type", io, {"E app_info_get_type return [-5]", failed}},
       // The package information is opened with package_info_create, though the
       // text names the package manager's call.
       {"package_info_create", PACKAGE_MANAGER_ERROR_NO_SUCH_PACKAGE,
-       {type, "E package_manager_get_package_info return [-18153359]", failed}},
-      {"package_info_is_system_package", io,
-       {type, "E package_info_is_system_package return [-5]", failed}},
-      {"package_info_is_removable_package", io,
-       {type, "E package_info_is_removable_package return [-5]", failed}},
-      {"package_info_is_preload_package", io,
-       {type, "E package_info_is_preload_package return [-5]", failed}},
-  };
+       {type, "E package_manager_get_package_info return [-18153359]", failed}}};
+  // The other reads name themselves; the package's come after the type line.
+  for (const char* call : {"app_info_is_nodisplay", "app_info_get_package", "app_info_get_icon",
+                           "app_info_get_label", "app_info_get_type"}) {
+    cases.push_back({call, io, {std::string("E ") + call + " return [-5]", failed}});
+  }
+  for (const char* call : {"package_info_is_system_package", "package_info_is_removable_package",
+                           "package_info_is_preload_package"}) {
+    cases.push_back({call, io, {type, std::string("E ") + call + " return [-5]", failed}});
+  }
   for (const auto& c : cases) {
     SCOPED_TRACE(c.call);
     device.ClearLogs();
@@ -136,8 +125,7 @@ TEST_F(AppInfoTest, EveryFailingCallIsLoggedAndReportedAsFalse) {
     boost::shared_ptr<GameBoxData> box = NewBox();
     EXPECT_FALSE(manager._GetAppInfo("com.ex.racer", box));
     EXPECT_EQ(c.logs, EngineMessages());
-    EXPECT_EQ("", box->name);
-    EXPECT_EQ("", box->pkgId);
+    EXPECT_EQ(Facts(GameBoxData()), Facts(*box));
     EXPECT_TRUE(manager.m_appInfoCache.empty());
     EXPECT_EQ(0, LeftOpen());
   }
@@ -151,6 +139,7 @@ TEST_F(AppInfoTest, SecondRequestIsAnsweredFromTheCache) {
   first->isLocked = first->isOnStorageCard = first->isUpdatable = true;
   first->isNewBadge = first->isSelected = true;
   first->badgeCount = 4;
+  first->appSize = 42;
   device.ClearLogs();
 
   boost::shared_ptr<GameBoxData> second = NewBox();
@@ -159,19 +148,14 @@ TEST_F(AppInfoTest, SecondRequestIsAnsweredFromTheCache) {
   second->col = 3;
   ASSERT_TRUE(manager.GetAppInfo("com.ex.racer", second));
   EXPECT_EQ(1, device.CallCount("app_info_create"));
-  EXPECT_EQ((std::vector<std::string>{"E Find a App Info Name[Racer] enable[1] system[0]"}),
-            EngineMessages());
-  EXPECT_EQ("Racer", second->name);
-  EXPECT_EQ("com.ex.racer", second->pkgId);
-  EXPECT_EQ("capp", second->pkgType);
-  EXPECT_TRUE(second->isPreload);
+  EXPECT_EQ((Ids{"E Find a App Info Name[Racer] enable[1] system[0]"}), EngineMessages());
+  EXPECT_EQ((Ids{"com.ex.racer", "as the caller had it", "capp", "Racer", kIcon, "010100 42"}),
+            Facts(*second));
   EXPECT_TRUE(second->isLocked && second->isOnStorageCard && second->isUpdatable);
   // Placement, appId, the third and sixth flags and the badge stay the caller's.
-  EXPECT_EQ("as the caller had it", second->appId);
-  EXPECT_EQ(12, second->boxId);
-  EXPECT_EQ(3, second->col);
+  EXPECT_EQ((std::vector<int>{12, 3, 0}), (std::vector<int>{second->boxId, second->col,
+                                                             second->badgeCount}));
   EXPECT_FALSE(second->isNewBadge || second->isSelected);
-  EXPECT_EQ(0, second->badgeCount);
   // The cache still holds the first record, which the caller may change.
   first->name = "Renamed by the launcher";
   ASSERT_TRUE(manager.GetAppInfo("com.ex.racer", second));

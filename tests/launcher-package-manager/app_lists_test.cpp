@@ -11,8 +11,6 @@ namespace {
 
 class AppListsTest : public PackageManagerTest {
  protected:
-  typedef std::vector<std::string> Ids;
-
   // Games, a disabled game, a non-game and a no-display game, in an order
   // that is not the sorted one.
   void SetUpMixedDevice() {
@@ -40,7 +38,7 @@ class AppListsTest : public PackageManagerTest {
 
 // ---- GetAppIdList
 
-TEST_F(AppListsTest, ListsEnabledDisplayableGamesSortedWithTheCallersEntries) {
+TEST_F(AppListsTest, ListsEnabledDisplayableGamesSortedWithTheCallersEntriesThenTrustsTheCache) {
   SetUpMixedDevice();
   Ids ids = {"com.ex.zz-callers", "com.ex.aa-callers"};
   ASSERT_TRUE(manager.GetAppIdList(ids));
@@ -50,22 +48,19 @@ TEST_F(AppListsTest, ListsEnabledDisplayableGamesSortedWithTheCallersEntries) {
   // The disabled game is cached all the same; only the listing leaves it out.
   EXPECT_EQ(4u, manager.m_appInfoCache.size());
   EXPECT_FALSE(manager.m_appInfoCache["com.ex.off"]->isEnabled);
-
-  std::vector<std::string> logs = EngineMessages();
+  Ids logs = EngineMessages();
   EXPECT_EQ("W # BEGIN", logs.front());
   EXPECT_EQ("W # END", logs.back());
   EXPECT_EQ(1, std::count(logs.begin(), logs.end(), "E  app_info_is_game FAILED [0] [0]"));
   EXPECT_EQ(0, LeftOpen());
-}
 
-TEST_F(AppListsTest, NonEmptyCacheIsTrustedWithoutAskingThePlatform) {
-  SetUpMixedDevice();
-  ASSERT_TRUE(manager.GetAppInfo("com.ex.mango", NewBox()));
+  // A cache holding anything is trusted without asking: a new game goes unseen.
+  device.AddGame("com.ex.new", "New");
   device.ClearLogs();
-  Ids ids;
+  ids.clear();
   ASSERT_TRUE(manager.GetAppIdList(ids));
-  EXPECT_EQ(Ids{"com.ex.mango"}, ids);
-  EXPECT_EQ(0, device.CallCount("app_info_filter_create"));
+  EXPECT_EQ((Ids{"com.ex.apple", "com.ex.mango", "com.ex.zebra"}), ids);
+  EXPECT_EQ(1, device.CallCount("app_info_filter_create"));
   EXPECT_EQ((Ids{"W # BEGIN", "W # END"}), EngineMessages());
   EXPECT_EQ(0, LeftOpen());
 }
@@ -168,7 +163,7 @@ TEST_F(AppListsTest, PackageListingFailures) {
 
 // ---- _IsMenuLaunch
 
-TEST_F(AppListsTest, MenuLaunchIsAFloatingCategoryOrTheFirstMetadataPair) {
+TEST_F(AppListsTest, MenuLaunchIsAFloatingCategoryOrTheFirstMetadataPairAndFalseOnFailure) {
   const std::pair<std::string, std::string> menuLaunch = {
       "http://velmora.com/tizen/metadata/menu/launch/operation", APP_CONTROL_OPERATION_MAIN};
   struct {
@@ -179,10 +174,10 @@ TEST_F(AppListsTest, MenuLaunchIsAFloatingCategoryOrTheFirstMetadataPair) {
   } cases[] = {
       {"plain", {}, {}, false},
       {"floating", {"http://velmora.com/category/floatingapp"}, {}, true},
-      {"menu launch first", {}, {menuLaunch, {"k", "v"}}, true},
       {"menu launch second: only the first pair is looked at", {}, {{"k", "v"}, menuLaunch}, false},
       {"another operation", {}, {{menuLaunch.first, APP_CONTROL_OPERATION_DEFAULT}}, false},
       {"another authority", {"http://tizen.org/category/floatingapp"}, {}, false},
+      {"menu launch first", {}, {menuLaunch, {"k", "v"}}, true},
   };
   device.AddGame("com.ex.racer", "Racer");
   for (const auto& c : cases) {
@@ -193,17 +188,13 @@ TEST_F(AppListsTest, MenuLaunchIsAFloatingCategoryOrTheFirstMetadataPair) {
   EXPECT_FALSE(manager._IsMenuLaunch("com.ex.unknown"));
   EXPECT_TRUE(EngineMessages().empty());
   EXPECT_EQ(0, LeftOpen());
-}
 
-TEST_F(AppListsTest, MenuLaunchFailuresAnswerFalse) {
-  device.AddGame("com.ex.racer", "Racer");
-  device.FindApp("com.ex.racer")->metadata = {
-      {"http://velmora.com/tizen/metadata/menu/launch/operation", APP_CONTROL_OPERATION_MAIN}};
+  // The last case's application again, with one call failing each time.
   struct {
     const char* call;
     int skip;
     Ids logs;
-  } cases[] = {
+  } failures[] = {
       {"app_info_filter_create", 0,
        {"E (APP_MANAGER_ERROR_NONE != app_info_filter_create(&handle))"}},
       {"app_info_filter_add_string", 0, {}},
@@ -212,12 +203,12 @@ TEST_F(AppListsTest, MenuLaunchFailuresAnswerFalse) {
       {"app_info_create", 0, {}},
       {"app_info_foreach_metadata", 0, {}},
   };
-  for (const auto& c : cases) {
-    SCOPED_TRACE(c.call);
+  for (const auto& f : failures) {
+    SCOPED_TRACE(f.call);
     device.ClearLogs();
-    device.FailNext(c.call, APP_MANAGER_ERROR_IO_ERROR, c.skip);
+    device.FailNext(f.call, APP_MANAGER_ERROR_IO_ERROR, f.skip);
     EXPECT_FALSE(manager._IsMenuLaunch("com.ex.racer"));
-    EXPECT_EQ(c.logs, EngineMessages());
+    EXPECT_EQ(f.logs, EngineMessages());
     EXPECT_EQ(0, LeftOpen());
   }
   EXPECT_TRUE(manager._IsMenuLaunch("com.ex.racer"));

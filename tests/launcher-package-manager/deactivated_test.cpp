@@ -9,8 +9,6 @@
 
 namespace {
 
-typedef std::vector<std::string> Ids;
-
 class DeactivatedTest : public PackageManagerTest {
  protected:
   // A package the user deactivated, holding |apps|.
@@ -83,7 +81,7 @@ TEST_F(DeactivatedTest, LoadHandsTheIdsToTheEngineOnlyWhenThereAreSome) {
   EXPECT_EQ(0, LeftOpen());
 }
 
-TEST_F(DeactivatedTest, InfoOfADeactivatedAppIsReadThroughFilters) {
+TEST_F(DeactivatedTest, InfoOfADeactivatedAppIsReadThroughFiltersAndOfAnUnknownOneNot) {
   sim::App off = sim::GameApp("com.ex.off.main", "Off");
   off.type = "webapp";
   off.icon.reset();
@@ -92,14 +90,15 @@ TEST_F(DeactivatedTest, InfoOfADeactivatedAppIsReadThroughFilters) {
   box->appId = "untouched";
 
   ASSERT_TRUE(manager._GetDeactivatedAppInfo("com.ex.off.main", box));
-  EXPECT_EQ("com.ex.off", box->pkgId);
-  EXPECT_EQ(DefaultIcon(), box->iconPath);
-  EXPECT_EQ("Off", box->name);
-  EXPECT_EQ("webapp", box->pkgType);
-  EXPECT_EQ("untouched", box->appId);
-  EXPECT_FALSE(box->isEnabled);
+  EXPECT_EQ((Ids{"com.ex.off", "untouched", "webapp", "Off", DefaultIcon(), "000000 0"}),
+            Facts(*box));
   EXPECT_EQ(0, device.CallCount("app_info_create"));  // filters only
   EXPECT_TRUE(manager.m_appInfoCache.empty());
+
+  boost::shared_ptr<GameBoxData> unknown = NewBox();
+  EXPECT_FALSE(manager._GetDeactivatedAppInfo("com.ex.none", unknown));
+  EXPECT_FALSE(manager._GetDeactivatedPkgInfo("com.ex.none", unknown));
+  EXPECT_EQ(Facts(GameBoxData()), Facts(*unknown));
   EXPECT_TRUE(EngineMessages().empty());
   EXPECT_EQ(0, LeftOpen());
 }
@@ -139,13 +138,6 @@ TEST_F(DeactivatedTest, InfoFailures) {
     EXPECT_EQ(c.logs, EngineMessages());
     EXPECT_EQ(0, LeftOpen());
   }
-}
-
-TEST_F(DeactivatedTest, UnknownAppReadsNothing) {
-  boost::shared_ptr<GameBoxData> box = NewBox();
-  EXPECT_FALSE(manager._GetDeactivatedAppInfo("com.ex.none", box));
-  EXPECT_FALSE(manager._GetDeactivatedPkgInfo("com.ex.none", box));
-  EXPECT_EQ("", box->pkgType);
 }
 
 }  // namespace

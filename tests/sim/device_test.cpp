@@ -1,5 +1,6 @@
-// The simulated device as a whole: the captured log, injected failures, call
-// and handle counts, what Reset forgets and keeps, and the sample device.
+// The simulated device as a whole, where the engine tests do not reach: the
+// log's echo and other tags, failures that hold until cleared, releasing a
+// handle twice, what Reset keeps, and the sample device.
 #include <E_DBus.h>
 #include <app_manager.h>
 #include <app_preference.h>
@@ -39,29 +40,43 @@ TEST_F(DeviceTest, LogCapturesEachLineAndEchoesItInReaderForm) {
   const std::string text = "device_test.cpp: TestBody(" + line + ") >  it's not the first launch";
   ASSERT_EQ(2u, device.Logs().size());
   EXPECT_EQ(DLOG_WARN, device.Logs()[0].priority);
-  EXPECT_EQ("tag-a", device.Logs()[0].tag);
-  EXPECT_EQ("plain text 7", device.Logs()[0].text);
-  EXPECT_EQ(DLOG_ERROR, device.Logs()[1].priority);
-  EXPECT_EQ("korrin", device.Logs()[1].tag);
+  EXPECT_EQ("tag-a: plain text 7", device.Logs()[0].tag + ": " + device.Logs()[0].text);
   EXPECT_EQ(text, device.Logs()[1].text);
   EXPECT_EQ("E/korrin(" + std::to_string(getpid()) + "): " + text + "\n", printed);
 }
 
-TEST_F(DeviceTest, InjectedFailuresHoldOnceAfterTheSkippedCallsOrAlways) {
+TEST_F(DeviceTest, InjectedFailuresHoldOnceOrUntilClearedAndOnlyForKnownCalls) {
   device.AddGame("com.ex.racer", "Racer");
   device.FailNext("app_info_create", APP_MANAGER_ERROR_IO_ERROR, 1);
-  EXPECT_EQ(APP_MANAGER_ERROR_NONE, Open("com.ex.racer"));
-  EXPECT_EQ(APP_MANAGER_ERROR_IO_ERROR, Open("com.ex.racer"));
-  EXPECT_EQ(APP_MANAGER_ERROR_NONE, Open("com.ex.racer"));
-  EXPECT_EQ(3, device.CallCount("app_info_create"));
-  EXPECT_EQ(2, device.CallCount("app_info_destroy"));
-
+  // Braced lists run left to right.
+  EXPECT_EQ((std::vector<int>{0, APP_MANAGER_ERROR_IO_ERROR, 0}),
+            (std::vector<int>{Open("com.ex.racer"), Open("com.ex.racer"), Open("com.ex.racer")}));
   device.FailAlways("app_info_create", APP_MANAGER_ERROR_DB_FAILED);
-  EXPECT_EQ(APP_MANAGER_ERROR_DB_FAILED, Open("com.ex.racer"));
-  EXPECT_EQ(APP_MANAGER_ERROR_DB_FAILED, Open("com.ex.racer"));
+  EXPECT_EQ((std::vector<int>{APP_MANAGER_ERROR_DB_FAILED, APP_MANAGER_ERROR_DB_FAILED}),
+            (std::vector<int>{Open("com.ex.racer"), Open("com.ex.racer")}));
   device.ClearFailures();
   EXPECT_EQ(APP_MANAGER_ERROR_NONE, Open("com.ex.racer"));
+  EXPECT_EQ(6, device.CallCount("app_info_create"));
+  EXPECT_EQ(3, device.CallCount("app_info_destroy"));
   EXPECT_EQ(0, HandlesOpenedByTest());
+
+  EXPECT_THROW(device.FailNext("app_info_get_lable", -5), std::invalid_argument);
+  EXPECT_THROW(device.FailAlways("e_dbus_shutdown", -5), std::invalid_argument);  // void
+  EXPECT_THROW(device.FailNext("app_info_create", 0), std::invalid_argument);
+  EXPECT_THROW(device.CallCount("nothing"), std::invalid_argument);
+  EXPECT_EQ(0, device.CallCount("e_dbus_shutdown"));
+}
+
+TEST_F(DeviceTest, CallsWithoutAnErrorCodeFailTheirOwnWay) {
+  device.FailNext("bundle_create", BUNDLE_ERROR_OUT_OF_MEMORY);
+  EXPECT_EQ(nullptr, bundle_create());
+  EXPECT_EQ(BUNDLE_ERROR_OUT_OF_MEMORY, get_last_result());
+  device.FailNext("e_dbus_init", -1);
+  EXPECT_EQ(0, e_dbus_init());
+  device.FailNext("mdm_get_application_state", APP_MANAGER_ERROR_IO_ERROR);
+  mdm_get_service();
+  EXPECT_EQ(MDM_STATUS_ERROR, mdm_get_application_state("com.ex.racer"));
+  mdm_release_service();
 }
 
 TEST_F(DeviceTest, HandlesCountUntilReleasedOnce) {
@@ -79,30 +94,10 @@ TEST_F(DeviceTest, HandlesCountUntilReleasedOnce) {
   EXPECT_EQ(0, HandlesOpenedByTest());
 }
 
-TEST_F(DeviceTest, CallsWithoutAnErrorCodeFailTheirOwnWay) {
-  device.FailNext("bundle_create", BUNDLE_ERROR_OUT_OF_MEMORY);
-  EXPECT_EQ(nullptr, bundle_create());
-  EXPECT_EQ(BUNDLE_ERROR_OUT_OF_MEMORY, get_last_result());
-  device.FailNext("e_dbus_init", -1);
-  EXPECT_EQ(0, e_dbus_init());
-  device.FailNext("mdm_get_application_state", APP_MANAGER_ERROR_IO_ERROR);
-  mdm_get_service();
-  EXPECT_EQ(MDM_STATUS_ERROR, mdm_get_application_state("com.ex.racer"));
-  mdm_release_service();
-}
-
-TEST_F(DeviceTest, UnknownCallNamesAreATestMistake) {
-  EXPECT_THROW(device.FailNext("app_info_get_lable", -5), std::invalid_argument);
-  EXPECT_THROW(device.FailAlways("e_dbus_shutdown", -5), std::invalid_argument);  // void
-  EXPECT_THROW(device.FailNext("app_info_create", 0), std::invalid_argument);
-  EXPECT_THROW(device.CallCount("nothing"), std::invalid_argument);
-  EXPECT_EQ(0, device.CallCount("e_dbus_shutdown"));
-}
-
 TEST_F(DeviceTest, ResetForgetsTheDeviceButKeepsHeldHandles) {
   package_manager_h client = NULL;
   ASSERT_EQ(PACKAGE_MANAGER_ERROR_NONE, package_manager_create(&client));
-  static int heard = 0;
+  static int heard;
   heard = 0;
   package_manager_set_event_cb(
       client,
@@ -129,23 +124,17 @@ TEST_F(DeviceTest, SampleDeviceIsALivedInPhone) {
   device.LoadSampleDevice();
   int games = 0, others = 0, noDisplay = 0, withoutIcon = 0, deactivated = 0;
   for (const sim::Package& pkg : device.Packages()) {
-    if (pkg.disabled) ++deactivated;
+    deactivated += pkg.disabled;
     for (const sim::App& app : pkg.apps) {
-      if (app.noDisplay) {
-        ++noDisplay;
-      } else if (app.game) {
-        ++games;
-        if (!app.icon) ++withoutIcon;
-      } else {
-        ++others;
-      }
+      noDisplay += app.noDisplay;
+      games += !app.noDisplay && app.game;
+      others += !app.noDisplay && !app.game;
+      withoutIcon += !app.noDisplay && app.game && !app.icon;
     }
   }
   EXPECT_GE(games, 30);
   EXPECT_GE(others, 4);
-  EXPECT_EQ(2, noDisplay);
-  EXPECT_EQ(1, withoutIcon);
-  EXPECT_EQ(1, deactivated);
+  EXPECT_EQ((std::vector<int>{2, 1, 1}), (std::vector<int>{noDisplay, withoutIcon, deactivated}));
   int width = 0;
   EXPECT_EQ(0, system_info_get_platform_int("http://tizen.org/feature/screen.width", &width));
   EXPECT_EQ(720, width);

@@ -13,7 +13,7 @@ const char kFeatureUse[] = "content://com.velmora.provider.usagelog/log/use_app_
 
 class LogClientTest : public SimTest {};
 
-TEST_F(LogClientTest, EventsCarryOnlyTheKeysGivenToTheSelectedProvider) {
+TEST_F(LogClientTest, EventsCarryOnlyTheKeysGivenToTheSelectedProviderAndNeedAFeature) {
   struct {
     const char* appId;
     const char* extra;
@@ -34,45 +34,34 @@ TEST_F(LogClientTest, EventsCarryOnlyTheKeysGivenToTheSelectedProvider) {
     for (const auto& c : cases) {
       client.InsertLog(c.appId, "launch", c.extra, c.value, c.isAppStatus);
     }
+    EXPECT_TRUE(EngineLogs().empty());
+    // Without a feature nothing is packed or sent.
+    client.InsertLog("com.ex.racer", NULL, "x", "1", true);
   }
   ASSERT_EQ(4u, device.UsageLogs().size());
   for (size_t i = 0; i < 4; ++i) {
     EXPECT_EQ(cases[i].provider, device.UsageLogs()[i].provider) << i;
     EXPECT_EQ(cases[i].fields, device.UsageLogs()[i].fields) << i;
   }
-  EXPECT_EQ(0, HandlesOpenedByTest());
-  EXPECT_TRUE(EngineLogs().empty());
-}
-
-TEST_F(LogClientTest, EventWithoutFeatureIsRefused) {
-  {
-    LogClientManager client;
-    client.InsertLog("com.ex.racer", NULL, "x", "1", true);
-  }
-  EXPECT_TRUE(device.UsageLogs().empty());
-  EXPECT_EQ(0, device.CallCount("bundle_create"));
+  EXPECT_EQ(4, device.CallCount("bundle_create"));
   EXPECT_EQ(std::vector<std::string>{"E feature is NULL"}, EngineMessages());
+  EXPECT_EQ(0, HandlesOpenedByTest());
 }
 
 TEST_F(LogClientTest, FailuresOfTheClientAreNotFatal) {
-  struct {
-    const char* call;
-    size_t recorded;
-  } cases[] = {
-      {"velmora_log_manager_create", 0},
-      {"bundle_create", 0},
-      {"bundle_add_str", 1},
-      {"velmora_log_manager_insert", 0},
-  };
+  const std::pair<const char*, size_t> cases[] = {{"velmora_log_manager_create", 0},
+                                                  {"bundle_create", 0},
+                                                  {"bundle_add_str", 1},  // the key left out
+                                                  {"velmora_log_manager_insert", 0}};
   for (const auto& c : cases) {
-    SCOPED_TRACE(c.call);
+    SCOPED_TRACE(c.first);
     device.Reset();
-    device.FailNext(c.call, -5);
+    device.FailNext(c.first, -5);
     {
       LogClientManager client;
       client.InsertLog("com.ex.racer", "launch", NULL, NULL, true);
     }
-    EXPECT_EQ(c.recorded, device.UsageLogs().size());
+    EXPECT_EQ(c.second, device.UsageLogs().size());
     EXPECT_EQ(0, HandlesOpenedByTest());
   }
 }
