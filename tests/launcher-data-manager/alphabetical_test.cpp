@@ -12,7 +12,7 @@ class AlphabeticalTest : public StoreTest {
   }
 
   // Each listed box as "name@pageId:col,row".
-  static std::vector<std::string> Placed(const std::vector<boost::shared_ptr<GameBoxData> >& boxes) {
+  static std::vector<std::string> Placed(const std::vector<boost::shared_ptr<GameBoxData>>& boxes) {
     std::vector<std::string> placed;
     for (const auto& box : boxes) {
       placed.push_back(box->name + "@" + std::to_string(box->pageId) + ":" +
@@ -45,7 +45,8 @@ TEST_F(AlphabeticalTest, MenuBoxesByNameWithoutRegardToCase) {
   AddNamedBox(page, "beta");
   AddNamedBox(page, "Alpha", 4, 4);
   AddNamedBox(page, "gamma");
-  AddBoxSql("isFolder, pageId, name, isPreload, boxType", "1, " + std::to_string(page) + ", 'Delta', 1, 3");
+  AddBoxSql("isFolder, pageId, name, isPreload, boxType",
+            "1, " + std::to_string(page) + ", 'Delta', 1, 3");
 
   std::vector<boost::shared_ptr<GameBoxData> > boxes =
       store.GetBoxDataListByAlphabeticalOrder(1, false);
@@ -202,6 +203,18 @@ TEST_F(AlphabeticalTest, WithoutAVirtualPageTheTargetIsAStoredPageOrTheNamedPare
                 {DLOG_ERROR, "launcher-data-manager.cpp", function, "No page [555556]"},
                 {DLOG_ERROR, "launcher-data-manager.cpp", function, "No page [555557]"}}),
             EngineLogs());
+}
+
+TEST_F(AlphabeticalTest, ADropOnAStoredPageTargetsMenuPagesWhateverAFolderListingLeftBehind) {
+  int menuPage = AddPage(1, 1);
+  ASSERT_EQ(1, menuPage);  // the same id as the first virtual page of a folder box 0
+  AddNamedBox(menuPage, "a");
+  AddNamedBox(AddPage(0, 1, true), "f");
+  int moved = AddNamedBox(AddPage(2, 1), "m");
+  ASSERT_EQ(1u, store.GetPageDataListByAlphabeticalOrder(0, true).size());
+
+  EXPECT_EQ(1, Drop(moved, menuPage, 1, "m"));
+  EXPECT_EQ("1/0 1:2,1", StoredPlace(moved));
 }
 
 TEST_F(AlphabeticalTest, RefusedEditsAreLoggedAndAnswerZero) {

@@ -42,27 +42,29 @@ class PackageTest : public SimTest {
 };
 
 TEST_F(PackageTest, OperationsSendTheirEventsAroundTheChange) {
-  sim::Package racer = sim::MakePackage("com.ex.racer", {sim::GameApp("com.ex.racer", "Racer")});
-  heard.appId = "com.ex.racer";
+  sim::Package racer =
+      sim::MakePackage("com.example.racer", {sim::GameApp("com.example.racer", "Racer")});
+  heard.appId = "com.example.racer";
 
   device.Install(racer);
   racer.apps[0].label = "Racer Deluxe";
   device.Update(racer);
   ASSERT_EQ(1u, device.Packages().size());  // replaced where it stood
   EXPECT_EQ("Racer Deluxe", *device.Packages()[0].apps[0].label);
-  EXPECT_TRUE(device.Uninstall("com.ex.racer"));
-  EXPECT_FALSE(device.Uninstall("com.ex.racer"));  // nothing sent
+  // An id the removal frees; long enough to live outside the string object.
+  EXPECT_TRUE(device.Uninstall(device.Packages()[0].id));
+  EXPECT_FALSE(device.Uninstall("com.example.racer"));  // nothing sent
 
   EXPECT_EQ((std::vector<std::string>{
-                "tpk com.ex.racer 0 0 0 0",
-                "tpk com.ex.racer 0 1 60 0",
-                "tpk com.ex.racer 0 2 100 0 readable",
-                "tpk com.ex.racer 2 0 0 0 readable",
-                "tpk com.ex.racer 2 1 60 0 readable",
-                "tpk com.ex.racer 2 2 100 0 readable",
-                "tpk com.ex.racer 1 0 0 0 readable",  // uninstall starts while readable
-                "tpk com.ex.racer 1 1 60 0 readable",
-                "tpk com.ex.racer 1 2 100 0",
+                "tpk com.example.racer 0 0 0 0",
+                "tpk com.example.racer 0 1 60 0",
+                "tpk com.example.racer 0 2 100 0 readable",
+                "tpk com.example.racer 2 0 0 0 readable",
+                "tpk com.example.racer 2 1 60 0 readable",
+                "tpk com.example.racer 2 2 100 0 readable",
+                "tpk com.example.racer 1 0 0 0 readable",  // uninstall starts while readable
+                "tpk com.example.racer 1 1 60 0 readable",
+                "tpk com.example.racer 1 2 100 0",
             }),
             heard.events);
 }
