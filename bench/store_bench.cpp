@@ -86,7 +86,9 @@ void Raw_GetBoxDataList(benchmark::State& state) {
 }
 
 void Store_GetBoxDataByAppId(benchmark::State& state) {
-  for (auto _ : state) benchmark::DoNotOptimize(TheLayout().store.GetBoxDataByAppId("com.ex.app5000"));
+  for (auto _ : state) {
+    benchmark::DoNotOptimize(TheLayout().store.GetBoxDataByAppId("com.ex.app5000"));
+  }
 }
 void Raw_GetBoxDataByAppId(benchmark::State& state) {
   for (auto _ : state) benchmark::DoNotOptimize(TheLayout().Raw(kByAppIdSql, "com.ex.app5000"));

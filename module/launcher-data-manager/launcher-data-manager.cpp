@@ -695,7 +695,8 @@ void LauncherDataManager::_ReorderData(int parentId, bool isFolder) {
 
   int placed = 0;
   for (size_t i = 0; i < pages.size(); ++i) {
-    if (pages[i]) placed += PackBoxes(*this, GetBoxDataList(pages[i]->pageId), columns, rows, false);
+    if (!pages[i]) continue;
+    placed += PackBoxes(*this, GetBoxDataList(pages[i]->pageId), columns, rows, false);
   }
 
   // With nothing placed at all, empty pages are kept and only renumbered.

@@ -154,8 +154,8 @@ TEST_F(DatabaseTest, OpenRefusesNullArgumentsAndPassesFlagsThrough) {
   EXPECT_EQ(SQLITE_CANTOPEN, db_util_open_with_options(DbPath().c_str(), &db,
                                                        SQLITE_OPEN_READONLY, NULL));
   sqlite3_close(db);
-  ASSERT_EQ(SQLITE_OK, db_util_open_with_options(
-                           DbPath().c_str(), &db, SQLITE_OPEN_READWRITE | SQLITE_OPEN_CREATE, NULL));
+  ASSERT_EQ(SQLITE_OK, db_util_open_with_options(DbPath().c_str(), &db,
+                                                 SQLITE_OPEN_READWRITE | SQLITE_OPEN_CREATE, NULL));
   EXPECT_EQ(SQLITE_OK, db_util_close(db));
 }
 

@@ -140,7 +140,8 @@ TEST_F(PackingTest, RearrangePacksFolderPagesFourWideInOneTransactionAndASecondP
   int folderPage = AddPage(folder, 2, true);
   AddPage(folder, 5, true);  // empty and not the only one: goes
   AddBox(folderPage, "x", 3, 1);
-  AddBoxSql("isFolder, pageId, name, col, row", "1, " + std::to_string(folderPage) + ", 'nested', 2, 2");
+  AddBoxSql("isFolder, pageId, name, col, row",
+            "1, " + std::to_string(folderPage) + ", 'nested', 2, 2");
   AddBox(folderPage, "y", 1, 3);
   AddBox(folderPage, "z", 4, 3);
   AddBox(folderPage, "w", 2, 4);

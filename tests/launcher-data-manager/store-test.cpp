@@ -73,7 +73,8 @@ std::vector<std::string> StoreTest::TakeStatements() {
 std::vector<std::pair<int, int> > StoreTest::Cells(
     const std::vector<boost::shared_ptr<GameBoxData> >& boxes) {
   std::vector<std::pair<int, int> > cells;
-  for (size_t i = 0; i < boxes.size(); ++i) cells.push_back(std::make_pair(boxes[i]->col, boxes[i]->row));
+  for (size_t i = 0; i < boxes.size(); ++i)
+    cells.push_back(std::make_pair(boxes[i]->col, boxes[i]->row));
   return cells;
 }
 

@@ -45,7 +45,9 @@ void PrintTables(sqlite3* db) {
   sqlite3_stmt* stmt = NULL;
   sqlite3_prepare_v2(db, "SELECT sql FROM sqlite_master WHERE type = 'table' AND name != "
                          "'sqlite_sequence'", -1, &stmt, NULL);
-  while (sqlite3_step(stmt) == SQLITE_ROW) std::cout << "  " << sqlite3_column_text(stmt, 0) << "\n";
+  while (sqlite3_step(stmt) == SQLITE_ROW) {
+    std::cout << "  " << sqlite3_column_text(stmt, 0) << "\n";
+  }
   sqlite3_finalize(stmt);
 }
 
@@ -108,7 +110,8 @@ int Demo(std::string root) {
               << "at the end of menu " << apps.menuId << ":\n";
     for (size_t i = 0; i < appIds.size(); ++i) {
       bool pageAdded = false;
-      boost::shared_ptr<GameBoxData> box = store.GetMenuBoxData(store.InsertBoxData(appIds[i], pageAdded));
+      boost::shared_ptr<GameBoxData> box =
+          store.GetMenuBoxData(store.InsertBoxData(appIds[i], pageAdded));
       if (packages.GetAppInfo(box->appId, box)) store.UpdateBoxData(*box);
     }
     PrintHomeScreen(store);
