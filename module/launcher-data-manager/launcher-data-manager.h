@@ -19,12 +19,23 @@
 
 #include "launcher-data-manager/game-data.h"
 
+class LauncherPackageManager;
+
 class LauncherDataManager {
  public:
   // Opens nothing; the connection is made by _OpenDb.
   LauncherDataManager();
   // Closes the connection.
   virtual ~LauncherDataManager();
+
+  // ---- Start-up.
+
+  // Opens the store and, when it holds no menu yet (the first launch on a
+  // device), lays out one menu "Apps" with a box for every id |pkgMgr| lists,
+  // four to a row, each insert committed by itself. True when the store was
+  // populated already or has just been; false, with nothing written, when the
+  // ids cannot be listed.
+  bool Initialize(LauncherPackageManager& pkgMgr);
 
   // ---- Connection and schema.
 

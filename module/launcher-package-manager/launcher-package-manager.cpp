@@ -69,6 +69,7 @@ LauncherPackageManager::LauncherPackageManager()
 }
 
 LauncherPackageManager::~LauncherPackageManager() {
+  if (s_bootSignalSubscriber == this) s_bootSignalSubscriber = NULL;
   Terminate();
   m_onStorageCardAppChanged.clear();
   m_onDeactivatedAppIds.clear();

@@ -54,10 +54,61 @@ class LauncherPackageManager {
   // jobs and the pending jobs, in that order.
   virtual ~LauncherPackageManager();
 
+  // ---- Package events and jobs.
+
+  // Copies the five callbacks into their slots, then registers for package
+  // events when there is a client. Always true: without a client the manager
+  // simply never hears of packages.
+  bool Initialize(const boost::function<void(const char*)>& onAppInstalled,
+                  const boost::function<void(const char*)>& onAppUpdated,
+                  const boost::function<void(const char*)>& onAppUninstalled,
+                  const boost::function<void(std::vector<std::string>)>& onDeactivatedAppIds,
+                  const boost::function<void(const char*)>& onStorageCardAppChanged);
+  // The platform's event callback; the user data is the manager, to which all
+  // seven arguments go on unchanged.
+  static void _PkgMgrClientListenCb(const char* type, const char* package,
+                                    package_manager_event_type_e event_type,
+                                    package_manager_event_state_e event_state, int progress,
+                                    package_manager_error_e error, void* user_data);
+  // One package event: STARTED records a job for the package (replacing any
+  // pending one), COMPLETED takes it out and processes it, or holds it back
+  // while paused, FAILED drops it. Type and state values outside the
+  // platform's enums are logged, never trusted.
+  void OnClientListenCb(const char* type, const char* package,
+                        package_manager_event_type_e event_type,
+                        package_manager_event_state_e event_state, int progress,
+                        package_manager_error_e error, void* user_data);
+  // Holds completed jobs back until StartListenCb. Always true.
+  bool PauseListenCb();
+  // Stops holding back, then processes the held jobs in completion order.
+  // Always true.
+  bool StartListenCb();
+  // Turns one completed job (never null) into the callbacks of its
+  // applications. Always true; boost::bad_function_call when a slot it must
+  // fire is empty.
+  bool _DoPkgJob(boost::shared_ptr<PkgData> job);
   // Unregisters the event callback and destroys the client. True when there
   // is no client left; false, logged, keeping the client, when either call
   // fails.
   bool Terminate();
+
+  // ---- Storage card and boot signal.
+
+  // Subscribes to the system bus's boot-done signal. True when subscribed;
+  // false, logged, with no connection kept, otherwise. The launcher has one
+  // manager: the latest to subscribe is the one the signal acts on.
+  bool _RegisterEdbusSignalHandler();
+  // Drops the subscription and the connection, if any, and shuts e_dbus down
+  // in every case.
+  void UnregisterEdbusSignalHandler();
+  // Records |status| (0: no card) and fires m_onStorageCardAppChanged for
+  // every cached application marked as living on the card, by id.
+  void OnMMCStatusChanged(int status);
+  // The boot-done handler, once per subscription: reads the storage-card
+  // status (no card when unreadable), hands it to OnMMCStatusChanged and
+  // unsubscribes. The subscription carries no user data; a null |data| means
+  // the manager that subscribed.
+  static void _BootingDoneSignalCb(void* data, DBusMessage* message);
 
   // ---- Application information.
 
@@ -149,6 +200,9 @@ class LauncherPackageManager {
   E_DBus_Signal_Handler* m_bootSignalHandler;  // null when not subscribed
   E_DBus_Connection* m_dbusConnection;         // null when not connected
   bool m_isMmcInserted;                        // last status received
+  // The manager the boot-done handler acts on, since the bus hands it no user
+  // data: the latest to subscribe, until it unsubscribes or is destroyed.
+  static LauncherPackageManager* s_bootSignalSubscriber;
 };
 
 #endif  // KORRIN_LAUNCHER_PACKAGE_MANAGER_LAUNCHER_PACKAGE_MANAGER_H_
