@@ -61,6 +61,12 @@ int Enter(const char* name) {
   RequireKnown(FailableCalls(), name);
   State& state = TheState();
   int call = ++state.callCounts[name];
+  std::map<std::string, std::function<void()>>::iterator before = state.beforeNext.find(name);
+  if (before != state.beforeNext.end()) {
+    std::function<void()> action = std::move(before->second);
+    state.beforeNext.erase(before);
+    action();  // may make platform calls of its own
+  }
   std::map<std::string, int>::const_iterator always = state.alwaysFail.find(name);
   if (always != state.alwaysFail.end()) return always->second;
   std::map<int, int>& pending = state.failAtCall[name];
@@ -92,6 +98,11 @@ void Device::FailAlways(const std::string& call, int error) {
 void Device::ClearFailures() {
   TheState().alwaysFail.clear();
   TheState().failAtCall.clear();
+}
+
+void Device::BeforeNext(const std::string& call, std::function<void()> action) {
+  if (FailableCalls().count(call) == 0) throw std::invalid_argument("cannot act before " + call);
+  TheState().beforeNext[call] = std::move(action);
 }
 
 int Device::CallCount(const std::string& call) const {

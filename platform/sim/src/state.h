@@ -115,6 +115,7 @@ struct State {
   std::map<std::string, int> callCounts;
   std::map<std::string, int> alwaysFail;                 // name -> error
   std::map<std::string, std::map<int, int>> failAtCall;  // name -> call number -> error
+  std::map<std::string, std::function<void()>> beforeNext;  // name -> action, once
 
   Held held;
 };

@@ -12,6 +12,7 @@
 #include <mdm.h>
 #include <package_info.h>
 
+#include <functional>
 #include <map>
 #include <optional>
 #include <string>
@@ -156,6 +157,10 @@ class Device {
   void FailNext(const std::string& call, int error, int skip = 0);
   void FailAlways(const std::string& call, int error);
   void ClearFailures();
+  // Runs |action| once, when |call| is next made, before the call does
+  // anything else: the device acting in the middle of an engine operation,
+  // such as a package that completes while the launcher starts.
+  void BeforeNext(const std::string& call, std::function<void()> action);
   // How often |call| was made since the last Reset.
   int CallCount(const std::string& call) const;
 

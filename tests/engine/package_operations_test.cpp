@@ -1,0 +1,242 @@
+// Package operations end to end: the platform's events reach the layout
+// through the package tracker and the engine's handlers.
+#include <app_manager.h>
+#include <mdm.h>
+
+#include "engine/engine-test.h"
+
+namespace {
+
+class PackageOperationsTest : public EngineTest {
+ protected:
+  // A started engine whose first menu holds Alpha to Echo on page 1.
+  void StartWithFiveGames() {
+    AddGames({"Alpha", "Bravo", "Charlie", "Delta", "Echo"});
+    Start();
+  }
+
+  void Emit(const std::string& pkgId, int type, int state) {
+    device.EmitPackageEvent("tpk", pkgId, type, state);
+  }
+
+  // An application box or shortcut (type 3) stored directly; returns its id.
+  int AddBox(int pageId, const std::string& appId, int col, int row, int boxType = 0) {
+    db->Exec("INSERT INTO Boxes(isFolder, pageId, appId, name, col, row, isPreload, isSystem, "
+             "boxType, launchType) VALUES(0, " + std::to_string(pageId) + ", '" + appId +
+             "', '" + appId + "', " + std::to_string(col) + ", " + std::to_string(row) +
+             ", 0, 0, " + std::to_string(boxType) + ", 0)");
+    return std::stoi(db->Value("SELECT last_insert_rowid()"));
+  }
+
+  int AddPage(int parentId, int pageNo, bool isFolder) {
+    db->Exec("INSERT INTO Pages(isFolder, parentId, pageNo) VALUES(" +
+             std::to_string(isFolder) + ", " + std::to_string(parentId) + ", " +
+             std::to_string(pageNo) + ")");
+    return std::stoi(db->Value("SELECT last_insert_rowid()"));
+  }
+
+  // Boxes whose appId and name are both exactly |text|, byte for byte.
+  int BoxesNamed(const std::string& text) {
+    sqlite3_stmt* stmt = NULL;
+    sqlite3_prepare_v2(db->db(), "SELECT COUNT(*) FROM Boxes WHERE appId = ?1 AND name = ?1",
+                       -1, &stmt, NULL);
+    sqlite3_bind_text(stmt, 1, text.data(), static_cast<int>(text.size()), SQLITE_STATIC);
+    int count = sqlite3_step(stmt) == SQLITE_ROW ? sqlite3_column_int(stmt, 0) : -1;
+    sqlite3_finalize(stmt);
+    return count;
+  }
+
+  std::string CountOf(const std::string& appId) {
+    return db->Value("SELECT COUNT(*) FROM Boxes WHERE appId = '" + appId + "'");
+  }
+};
+
+TEST_F(PackageOperationsTest, AnInstallPlacesEachGameAtTheEndOfMenuOneWithItsLabel) {
+  StartWithFiveGames();
+  device.Install(sim::MakePackage(
+      "pack", {sim::GameApp("pack.tide", "Tide"), sim::GameApp("pack.ember", "Ember")}));
+  EXPECT_EQ((Lines{"alpha 1,1", "bravo 2,1", "charlie 3,1", "delta 4,1", "echo 1,2",
+                   "pack.tide 2,2", "pack.ember 3,2"}),
+            Page(1));
+  // The application form of the box update writes no icon path.
+  EXPECT_EQ((std::vector<Row>{{"Tide", "NULL"}, {"Ember", "NULL"}}),
+            db->Rows("SELECT name, iconPath FROM Boxes WHERE appId LIKE 'pack.%' ORDER BY col"));
+
+  // Installed again: the placed games are neither moved nor rewritten.
+  std::vector<Row> before = Tables();
+  device.Install(sim::MakePackage(
+      "pack", {sim::GameApp("pack.tide", "Tide 2"), sim::GameApp("pack.ember", "Ember 2")}));
+  EXPECT_EQ(before, Tables());
+}
+
+TEST_F(PackageOperationsTest, AnInstallOfADisabledOrNonGameApplicationPlacesNothingOfIt) {
+  StartWithFiveGames();
+  sim::App off = sim::GameApp("quiet.off", "Off");
+  off.enabled = false;
+  device.Install(sim::MakePackage("quiet", {sim::GameApp("quiet.on", "On"), off}));
+  EXPECT_EQ("1", CountOf("quiet.on"));
+  EXPECT_EQ("0", CountOf("quiet.off"));
+  device.Install(sim::MakePackage("notes", {sim::PlainApp("notes", "Notes")}));
+  EXPECT_EQ("0", CountOf("notes"));
+}
+
+TEST_F(PackageOperationsTest, AnUpdateWritesTheNewLabelWhereTheBoxStands) {
+  StartWithFiveGames();
+  device.Update(Game("charlie", "Charlie Deluxe"));
+  EXPECT_EQ((std::vector<Row>{{"3", "1", "Charlie Deluxe"}}),
+            db->Rows("SELECT col, row, name FROM Boxes WHERE appId = 'charlie'"));
+
+  // A game updated before it ever had a box is placed like an install.
+  device.AddGame("foxtrot", "Foxtrot");
+  device.Update(Game("foxtrot", "Foxtrot"));
+  EXPECT_EQ((std::vector<Row>{{"2", "2", "Foxtrot"}}),
+            db->Rows("SELECT col, row, name FROM Boxes WHERE appId = 'foxtrot'"));
+}
+
+TEST_F(PackageOperationsTest, AnUpdateWhoseInformationCannotBeReadLeavesTheRow) {
+  StartWithFiveGames();
+  device.Update(Game("charlie", "Charlie Deluxe"));
+  std::vector<Row> before = Tables();
+  device.FailAlways("app_info_get_label", APP_MANAGER_ERROR_IO_ERROR);
+  device.Update(Game("charlie", "Charlie Gold"));
+  EXPECT_EQ(before, Tables());
+}
+
+TEST_F(PackageOperationsTest, AnUpdateThatDisablesAGameTakesItsBoxAwayWhateverThePolicy) {
+  StartWithFiveGames();
+  device.SetMdm(true, {{"bravo", MDM_RESTRICTED}});
+  sim::Package bravo = Game("bravo", "Bravo");
+  bravo.apps[0].enabled = false;
+  device.Update(bravo);
+  EXPECT_EQ((Lines{"alpha 1,1", "charlie 2,1", "delta 3,1", "echo 4,1"}), Page(1));
+}
+
+TEST_F(PackageOperationsTest, AnUninstallTakesTheBoxAndItsShortcutsAndClosesEachPageFourWide) {
+  StartWithFiveGames();
+  // Shortcuts of Charlie beside its box, alone on a second page, and in a
+  // folder whose page holds five boxes.
+  AddBox(1, "charlie", 2, 2, 3);
+  int folder = AddBox(1, "", 3, 2);
+  db->Exec("UPDATE Boxes SET isFolder = 1, name = 'Folder' WHERE boxId = " +
+           std::to_string(folder));
+  int lonely = AddPage(1, 2, false);
+  AddBox(lonely, "charlie", 1, 1, 3);
+  int inFolder = AddPage(folder, 1, true);
+  AddBox(inFolder, "x", 1, 1);
+  AddBox(inFolder, "charlie", 2, 1, 3);
+  AddBox(inFolder, "y", 3, 1);
+  AddBox(inFolder, "z", 1, 2);
+  AddBox(inFolder, "w", 2, 2);
+  device.ClearLogs();
+
+  device.Uninstall("charlie");
+  EXPECT_EQ("0", CountOf("charlie"));
+  EXPECT_EQ((Lines{"alpha 1,1", "bravo 2,1", "delta 3,1", "echo 4,1", "[Folder] 1,2"}), Page(1));
+  EXPECT_EQ((Lines{"x 1,1", "y 2,1", "z 3,1", "w 4,1"}), Page(inFolder));  // not 3 by 3
+  EXPECT_EQ(Lines{}, Page(lonely));
+  EXPECT_EQ("1", db->Value("SELECT COUNT(*) FROM Pages WHERE pageId = " +
+                           std::to_string(lonely)));
+  // Page 1 is met again among the shortcuts, which come by row, then col.
+  std::vector<EngineLog> warnings;
+  for (const EngineLog& log : EngineLogs()) {
+    if (log.priority == 5) warnings.push_back(log);
+  }
+  EXPECT_EQ((std::vector<EngineLog>{{5, "korrin-data.cpp", "_removeShortcut",
+                                     "Do not add page"}}),
+            warnings);
+}
+
+TEST_F(PackageOperationsTest, AnUninstallOfAGameWithoutBoxesWritesNothing) {
+  StartWithFiveGames();
+  device.AddGame("ghost", "Ghost");
+  std::vector<Row> before = Tables();
+  device.Uninstall("ghost");
+  EXPECT_EQ(before, Tables());
+}
+
+// ---- Event streams the platform may send.
+
+TEST_F(PackageOperationsTest, OnlyTheLatestStartOfAPackageIsProcessed) {
+  StartWithFiveGames();
+  Emit("alpha", PACKAGE_MANAGER_EVENT_TYPE_UNINSTALL, PACKAGE_MANAGER_EVENT_STATE_STARTED);
+  Emit("alpha", PACKAGE_MANAGER_EVENT_TYPE_UPDATE, PACKAGE_MANAGER_EVENT_STATE_STARTED);
+  Emit("alpha", PACKAGE_MANAGER_EVENT_TYPE_UPDATE, PACKAGE_MANAGER_EVENT_STATE_COMPLETED);
+  EXPECT_EQ("Alpha", db->Value("SELECT name FROM Boxes WHERE appId = 'alpha'"));
+  EXPECT_TRUE(packages.m_pkgJobMap.empty());
+}
+
+TEST_F(PackageOperationsTest, AFailedOperationLeavesNoTrace) {
+  StartWithFiveGames();
+  std::vector<Row> before = Tables();
+  Emit("bravo", PACKAGE_MANAGER_EVENT_TYPE_UNINSTALL, PACKAGE_MANAGER_EVENT_STATE_STARTED);
+  Emit("bravo", PACKAGE_MANAGER_EVENT_TYPE_UNINSTALL, PACKAGE_MANAGER_EVENT_STATE_FAILED);
+  device.ClearLogs();
+  Emit("bravo", PACKAGE_MANAGER_EVENT_TYPE_UNINSTALL, PACKAGE_MANAGER_EVENT_STATE_COMPLETED);
+  EXPECT_EQ(Lines{"E #Step 1"}, EngineMessages());
+  EXPECT_EQ(before, Tables());
+}
+
+TEST_F(PackageOperationsTest, UnknownTypesAndStatesAreLoggedAndChangeNothing) {
+  StartWithFiveGames();
+  std::vector<Row> before = Tables();
+  device.ClearLogs();
+  Emit("alpha", 7, PACKAGE_MANAGER_EVENT_STATE_STARTED);
+  Emit("alpha", 7, PACKAGE_MANAGER_EVENT_STATE_COMPLETED);
+  Emit("alpha", PACKAGE_MANAGER_EVENT_TYPE_INSTALL, 9);
+  Emit("alpha", -1, -100);
+  EXPECT_EQ((Lines{"E Invalid event_type: 7\n", "E #Step 1", "E #Step 2", "E #Step 3 size[0]",
+                   "E Invalid event_state: 9\n", "E Invalid event_state: -100\n"}),
+            EngineMessages());
+  EXPECT_EQ(before, Tables());
+}
+
+TEST_F(PackageOperationsTest, ACompletionNeverStartedIsIgnored) {
+  StartWithFiveGames();
+  std::vector<Row> before = Tables();
+  device.AddGame("stranger", "Stranger");
+  device.ClearLogs();
+  Emit("stranger", PACKAGE_MANAGER_EVENT_TYPE_INSTALL, PACKAGE_MANAGER_EVENT_STATE_COMPLETED);
+  EXPECT_EQ(Lines{"E #Step 1"}, EngineMessages());
+  EXPECT_EQ(before, Tables());
+}
+
+// Package ids as the platform might send them: the event path neither
+// crashes nor loses a row, and ids are stored byte for byte.
+TEST_F(PackageOperationsTest, HostileIdsAreHandledAndStoredByteForByte) {
+  StartWithFiveGames();
+  const std::string ids[] = {
+      "it's \"quoted\"",
+      "x'); DROP TABLE Boxes; --",
+      "com.ex.\xc3\xa9t\xc3\xa9-\xe6\xb8\xb8\xe6\x88\x8f",
+      "bad-utf8-\xff\xfe\xc3",
+      std::string(65536, 'g'),
+  };
+  for (const std::string& id : ids) {
+    SCOPED_TRACE(id.substr(0, 40));
+    device.Install(Game(id, id));
+    EXPECT_EQ(1, BoxesNamed(id));
+    device.Uninstall(id);
+    EXPECT_EQ(0, BoxesNamed(id));
+    EXPECT_EQ("5", db->Value("SELECT COUNT(*) FROM Boxes"));
+  }
+
+  // Ids that name nothing, or nothing at all.
+  std::vector<Row> before = Tables();
+  for (const char* id : {"", "never.installed"}) {
+    for (int type : {PACKAGE_MANAGER_EVENT_TYPE_INSTALL, PACKAGE_MANAGER_EVENT_TYPE_UPDATE,
+                     PACKAGE_MANAGER_EVENT_TYPE_UNINSTALL}) {
+      Emit(id, type, PACKAGE_MANAGER_EVENT_STATE_STARTED);
+      Emit(id, type, PACKAGE_MANAGER_EVENT_STATE_COMPLETED);
+    }
+  }
+  for (int state : {PACKAGE_MANAGER_EVENT_STATE_STARTED, PACKAGE_MANAGER_EVENT_STATE_COMPLETED}) {
+    LauncherPackageManager::_PkgMgrClientListenCb(
+        "tpk", NULL, PACKAGE_MANAGER_EVENT_TYPE_UNINSTALL,
+        static_cast<package_manager_event_state_e>(state), 0, PACKAGE_MANAGER_ERROR_NONE,
+        &packages);
+  }
+  EXPECT_EQ(before, Tables());
+  EXPECT_EQ("ok", db->Value("PRAGMA integrity_check"));
+}
+
+}  // namespace
