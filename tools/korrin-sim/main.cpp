@@ -1,10 +1,10 @@
 // korrin-sim: the engine on a simulated device, for launcher engineers at a
 // workstation.
 //
-//   korrin-sim demo [--root DIR]   a phone with a few dozen games: the layout
-//                                  database is made, every game gets a box at
-//                                  the end of the first menu with its label,
-//                                  and the home screen is shown
+//   korrin-sim demo [--root DIR]   a phone with a few dozen games: the engine
+//                                  starts (first launch lays the games out),
+//                                  a game is installed, and the home screen
+//                                  is shown after each step
 #include <errno.h>
 #include <stdlib.h>
 #include <string.h>
@@ -15,13 +15,12 @@
 #include <vector>
 
 #include "common/device-path.h"
-#include "launcher-data-manager/launcher-data-manager.h"
-#include "launcher-package-manager/launcher-package-manager.h"
+#include "korrin-data/korrin-data.h"
 #include "sim/device.h"
 
 namespace {
 
-const int kCellWidth = 20;
+const int kCellWidth = 16;  // four cells and the row number fit 80 columns
 
 int Usage() {
   std::cerr << "usage: korrin-sim demo [--root DIR]\n";
@@ -41,18 +40,16 @@ std::string Cell(const std::string& text, size_t width) {
   return out + std::string(width - chars, ' ');
 }
 
-void PrintTables(sqlite3* db) {
-  sqlite3_stmt* stmt = NULL;
-  sqlite3_prepare_v2(db, "SELECT sql FROM sqlite_master WHERE type = 'table' AND name != "
-                         "'sqlite_sequence'", -1, &stmt, NULL);
-  while (sqlite3_step(stmt) == SQLITE_ROW) {
-    std::cout << "  " << sqlite3_column_text(stmt, 0) << "\n";
-  }
-  sqlite3_finalize(stmt);
+// What the launcher shows for a box: its stored name, or else the label the
+// platform gives its application.
+std::string Label(LauncherPackageManager& packages, const GameBoxData& box) {
+  if (!box.name.empty()) return box.name;
+  boost::shared_ptr<GameBoxData> info(new GameBoxData(box));
+  return packages.GetAppInfo(box.appId, info) ? info->name : box.appId;
 }
 
 // The pages of menu 1 as grids of four columns, one box name per cell.
-void PrintHomeScreen(LauncherDataManager& store) {
+void PrintHomeScreen(LauncherDataManager& store, LauncherPackageManager& packages) {
   std::vector<boost::shared_ptr<GamePageData> > pages = store.GetPageDataList(1, false);
   for (size_t p = 0; p < pages.size(); ++p) {
     std::cout << "  page " << pages[p]->pageNo << "\n";
@@ -64,7 +61,7 @@ void PrintHomeScreen(LauncherDataManager& store) {
         row = boxes[b]->row;
         std::cout << "  " << Cell(std::to_string(row), 3);
       }
-      std::cout << "| " << Cell(boxes[b]->name, kCellWidth);
+      std::cout << "| " << Cell(Label(packages, *boxes[b]), kCellWidth);
     }
     std::cout << "\n";
   }
@@ -89,38 +86,30 @@ int Demo(std::string root) {
 
   int status = 0;
   {
-    LauncherDataManager store;
-    LauncherPackageManager packages;
-    store._OpenDb();
+    // The launcher's own start: the engine lays the games out on first launch.
+    data_engin_initialization();
+    LauncherDataManager& store = korrin::DataManager();
+    LauncherPackageManager& packages = korrin::PackageManager();
     if (store.m_db == NULL) {
       for (const sim::LogLine& line : device.Logs()) std::cerr << line.text << "\n";
       return 1;
     }
     std::cout << "device root: " << root << "\n"
               << "layout database: " << korrin::DevicePath(korrin::kGameDataDbPath) << "\n";
-    PrintTables(store.m_db);
 
-    GameViewData apps;
-    apps.name = "Apps";
-    apps.type = 0;
-    store.InsertMenuData(apps);
-    std::vector<std::string> appIds;
-    packages.GetAppIdList(appIds);
-    std::cout << "\n" << appIds.size() << " displayable games on the device; each gets a box "
-              << "at the end of menu " << apps.menuId << ":\n";
-    for (size_t i = 0; i < appIds.size(); ++i) {
-      bool pageAdded = false;
-      boost::shared_ptr<GameBoxData> box =
-          store.GetMenuBoxData(store.InsertBoxData(appIds[i], pageAdded));
-      if (packages.GetAppInfo(box->appId, box)) store.UpdateBoxData(*box);
-    }
-    PrintHomeScreen(store);
+    std::cout << "\nfirst launch: every displayable game gets a box in menu \"Apps\":\n";
+    PrintHomeScreen(store, packages);
+
+    device.Install(sim::MakePackage("com.lumaforge.skyharbor",
+                                    {sim::GameApp("com.lumaforge.skyharbor", "Sky Harbor")}));
+    std::cout << "\nSky Harbor installed: its box goes after the last one:\n";
+    PrintHomeScreen(store, packages);
 
     std::vector<boost::shared_ptr<GameBoxData> > sorted =
-        store.GetBoxDataListByAlphabeticalOrder(apps.menuId, false);
+        store.GetBoxDataListByAlphabeticalOrder(1, false);
     std::cout << "\nthe same menu in alphabetical order (first row):\n ";
     for (size_t i = 0; i < sorted.size() && sorted[i]->row == 1; ++i) {
-      std::cout << " | " << Cell(sorted[i]->name, kCellWidth);
+      std::cout << " | " << Cell(Label(packages, *sorted[i]), kCellWidth);
     }
     std::vector<std::string> deactivated = packages._GetDeactivatedAppIds();
     std::cout << "\n\ndeactivated applications:";
