@@ -119,8 +119,9 @@ class Device {
   // package is removed, COMPLETED. False, and nothing sent, for an unknown id.
   bool Uninstall(const std::string& pkgId);
   // One raw event, whatever the device holds. Values outside the platform's
-  // enums (a type above 3, a state above 3) are undefined behaviour for C++
-  // listeners, which the sanitizer build reports.
+  // enums reach listeners as the plain integers the platform would send; a
+  // C++ listener must not load them as its enum type (the sanitizers report
+  // that), but read the integer behind them.
   void EmitPackageEvent(const std::string& type, const std::string& pkgId, int eventType,
                         int eventState, int progress = 0,
                         int error = 0 /* PACKAGE_MANAGER_ERROR_NONE */);
