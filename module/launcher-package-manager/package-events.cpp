@@ -123,7 +123,8 @@ bool LauncherPackageManager::PauseListenCb() {
 
 bool LauncherPackageManager::StartListenCb() {
   m_isListenPaused = false;
-  // By index: a callback may pause again and hold a job back behind these.
+  // By index: a job that a callback's pause appends here is processed too,
+  // not lost to the clear below.
   for (size_t i = 0; i < m_pkgJobList.size(); ++i) {
     boost::shared_ptr<PkgData> job = m_pkgJobList[i];
     _DoPkgJob(job);

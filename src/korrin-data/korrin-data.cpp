@@ -44,28 +44,28 @@ void PlaceNewBox(const std::string& appId) {
   if (g_packageManager.GetAppInfo(box->appId, box)) g_dataManager.UpdateBoxData(*box);
 }
 
+// The box of |appId| when it has one. When it has none, one is placed, as
+// an install does, and an empty pointer comes back.
+BoxPtr FindOrPlaceBox(const char* appId) {
+  std::string id = AppIdText(appId);
+  BoxPtr existing = g_dataManager.GetBoxDataByAppId(id);
+  if (existing->boxId != 0) return existing;
+  PlaceNewBox(id);
+  return BoxPtr();
+}
+
 // An install of an application that is placed already only refreshes what
 // the package tracker knows of it: the launcher's row is never touched.
 void OnAppInstalled(const char* appId) {
-  std::string id = AppIdText(appId);
-  BoxPtr existing = g_dataManager.GetBoxDataByAppId(id);
-  if (existing->boxId == 0) {
-    PlaceNewBox(id);
-    return;
-  }
-  g_packageManager.GetAppInfo(existing->appId, existing);
+  BoxPtr existing = FindOrPlaceBox(appId);
+  if (existing) g_packageManager.GetAppInfo(existing->appId, existing);
 }
 
 // An update places an application that has no box, and otherwise writes its
 // fresh label into the box where it stands.
 void OnAppUpdated(const char* appId) {
-  std::string id = AppIdText(appId);
-  BoxPtr existing = g_dataManager.GetBoxDataByAppId(id);
-  if (existing->boxId == 0) {
-    PlaceNewBox(id);
-    return;
-  }
-  if (g_packageManager.GetAppInfo(existing->appId, existing)) {
+  BoxPtr existing = FindOrPlaceBox(appId);
+  if (existing && g_packageManager.GetAppInfo(existing->appId, existing)) {
     g_dataManager.UpdateBoxData(*existing);
   }
 }
