@@ -80,8 +80,8 @@ class LauncherPackageManager {
                         package_manager_error_e error, void* user_data);
   // Holds completed jobs back until StartListenCb. Always true.
   bool PauseListenCb();
-  // Stops holding back, then processes the held jobs in completion order.
-  // Always true.
+  // Stops holding back, then processes the held jobs in completion order,
+  // until none is left or a callback pauses again. Always true.
   bool StartListenCb();
   // Turns one completed job (never null) into the callbacks of its
   // applications. Always true; boost::bad_function_call when a slot it must
@@ -94,9 +94,11 @@ class LauncherPackageManager {
 
   // ---- Storage card and boot signal.
 
-  // Subscribes to the system bus's boot-done signal. True when subscribed;
-  // false, logged, with no connection kept, otherwise. The launcher has one
-  // manager: the latest to subscribe is the one the signal acts on.
+  // Subscribes to the system bus's boot-done signal. True when subscribed
+  // (already, or now); false, logged, with no connection kept, otherwise. The
+  // launcher has one manager: the latest to subscribe is the one the signal
+  // acts on. Subscribe once the callbacks are in place (after Initialize):
+  // the signal fires m_onStorageCardAppChanged.
   bool _RegisterEdbusSignalHandler();
   // Drops the subscription and the connection, if any, and shuts e_dbus down
   // in every case.

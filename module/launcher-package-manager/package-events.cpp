@@ -123,13 +123,14 @@ bool LauncherPackageManager::PauseListenCb() {
 
 bool LauncherPackageManager::StartListenCb() {
   m_isListenPaused = false;
-  // By index: a job that a callback's pause appends here is processed too,
-  // not lost to the clear below.
-  for (size_t i = 0; i < m_pkgJobList.size(); ++i) {
-    boost::shared_ptr<PkgData> job = m_pkgJobList[i];
+  // Each job leaves the list before it runs, so a callback that pauses again
+  // holds the rest back, and one that starts a replay of its own runs none
+  // of them twice.
+  while (!m_pkgJobList.empty() && !m_isListenPaused) {
+    boost::shared_ptr<PkgData> job = m_pkgJobList.front();
+    m_pkgJobList.erase(m_pkgJobList.begin());
     _DoPkgJob(job);
   }
-  m_pkgJobList.clear();
   return true;
 }
 

@@ -25,6 +25,9 @@ const char kStorageCardStatusKey[] = "memory/sysman/mmc";
 LauncherPackageManager* LauncherPackageManager::s_bootSignalSubscriber = NULL;
 
 bool LauncherPackageManager::_RegisterEdbusSignalHandler() {
+  // Subscribed already: a second subscription would fire the handler twice
+  // and leave the first connection open for good.
+  if (m_bootSignalHandler != NULL) return true;
   bool initialised = false;
   for (int i = 0; i < kBusInitTries && !initialised; ++i) initialised = e_dbus_init() > 0;
   if (!initialised) {

@@ -177,6 +177,33 @@ TEST_F(PackageEventsTest, PausedCompletionsReplayInCompletionOrderOnceUnpaused) 
   EXPECT_FALSE(manager.m_isListenPaused);
 }
 
+TEST_F(PackageEventsTest, AReplayThatACallbackPausesOrRestartsRunsNoJobTwice) {
+  Listen();
+  manager.PauseListenCb();
+  for (const char* id : {"com.ex.a", "com.ex.b", "com.ex.c"}) {
+    device.Install(sim::MakePackage(id, {sim::GameApp(id, id)}));
+  }
+  manager.m_onAppInstalled = [this](const char* appId) {
+    heard.push_back(appId);
+    if (std::string(appId) == "com.ex.a") manager.StartListenCb();  // runs b and c
+  };
+  manager.StartListenCb();
+  EXPECT_EQ((Ids{"com.ex.a", "com.ex.b", "com.ex.c"}), Heard());
+
+  manager.PauseListenCb();
+  for (const char* id : {"com.ex.d", "com.ex.e"}) {
+    device.Install(sim::MakePackage(id, {sim::GameApp(id, id)}));
+  }
+  manager.m_onAppInstalled = [this](const char* appId) {
+    heard.push_back(appId);
+    manager.PauseListenCb();  // e is held back again
+  };
+  manager.StartListenCb();
+  EXPECT_EQ(Ids{"com.ex.d"}, Heard());
+  ASSERT_EQ(1u, manager.m_pkgJobList.size());
+  EXPECT_EQ("com.ex.e", manager.m_pkgJobList[0]->pkgId);
+}
+
 TEST_F(PackageEventsTest, EventsAreHeardFromInitializeUntilTerminateAndNeverWithoutAClient) {
   EXPECT_EQ(0, device.PackageListeners());
   EXPECT_TRUE(Listen());
