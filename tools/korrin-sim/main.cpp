@@ -105,14 +105,8 @@ int Demo(std::string root) {
     std::cout << "\nSky Harbor installed: its box goes after the last one:\n";
     PrintHomeScreen(store, packages);
 
-    std::vector<boost::shared_ptr<GameBoxData> > sorted =
-        store.GetBoxDataListByAlphabeticalOrder(1, false);
-    std::cout << "\nthe same menu in alphabetical order (first row):\n ";
-    for (size_t i = 0; i < sorted.size() && sorted[i]->row == 1; ++i) {
-      std::cout << " | " << Cell(Label(packages, *sorted[i]), kCellWidth);
-    }
     std::vector<std::string> deactivated = packages._GetDeactivatedAppIds();
-    std::cout << "\n\ndeactivated applications:";
+    std::cout << "\ndeactivated applications:";
     for (size_t i = 0; i < deactivated.size(); ++i) std::cout << " " << deactivated[i];
     std::cout << "\n";
   }
