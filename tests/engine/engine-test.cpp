@@ -41,13 +41,3 @@ Lines EngineTest::Page(int pageId) {
   }
   return cells;
 }
-
-std::vector<Row> EngineTest::Tables() {
-  std::vector<Row> rows;
-  for (const char* table : {"Menus", "Pages", "Boxes"}) {
-    for (Row& row : db->Rows(std::string("SELECT '") + table + "', * FROM " + table)) {
-      rows.push_back(row);
-    }
-  }
-  return rows;
-}

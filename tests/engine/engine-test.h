@@ -33,8 +33,6 @@ class EngineTest : public SimTest {
   // The boxes of a stored page in reading order, each "appId col,row"; a box
   // without an appId (a folder) shows its name in brackets.
   Lines Page(int pageId);
-  // Every row of the three tables, to show that nothing was written.
-  std::vector<Row> Tables();
 
   LauncherDataManager& store;
   LauncherPackageManager& packages;

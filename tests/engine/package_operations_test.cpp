@@ -63,10 +63,10 @@ TEST_F(PackageOperationsTest, AnInstallPlacesEachGameAtTheEndOfMenuOneWithItsLab
             db->Rows("SELECT name, iconPath FROM Boxes WHERE appId LIKE 'pack.%' ORDER BY col"));
 
   // Installed again: the placed games are neither moved nor rewritten.
-  std::vector<Row> before = Tables();
+  std::vector<Row> before = db->Layout();
   device.Install(sim::MakePackage(
       "pack", {sim::GameApp("pack.tide", "Tide 2"), sim::GameApp("pack.ember", "Ember 2")}));
-  EXPECT_EQ(before, Tables());
+  EXPECT_EQ(before, db->Layout());
 }
 
 TEST_F(PackageOperationsTest, AnInstallOfADisabledOrNonGameApplicationPlacesNothingOfIt) {
@@ -96,10 +96,10 @@ TEST_F(PackageOperationsTest, AnUpdateWritesTheNewLabelWhereTheBoxStands) {
 TEST_F(PackageOperationsTest, AnUpdateWhoseInformationCannotBeReadLeavesTheRow) {
   StartWithFiveGames();
   device.Update(Game("charlie", "Charlie Deluxe"));
-  std::vector<Row> before = Tables();
+  std::vector<Row> before = db->Layout();
   device.FailAlways("app_info_get_label", APP_MANAGER_ERROR_IO_ERROR);
   device.Update(Game("charlie", "Charlie Gold"));
-  EXPECT_EQ(before, Tables());
+  EXPECT_EQ(before, db->Layout());
 }
 
 TEST_F(PackageOperationsTest, AnUpdateThatDisablesAGameTakesItsBoxAwayWhateverThePolicy) {
@@ -149,9 +149,9 @@ TEST_F(PackageOperationsTest, AnUninstallTakesTheBoxAndItsShortcutsAndClosesEach
 TEST_F(PackageOperationsTest, AnUninstallOfAGameWithoutBoxesWritesNothing) {
   StartWithFiveGames();
   device.AddGame("ghost", "Ghost");
-  std::vector<Row> before = Tables();
+  std::vector<Row> before = db->Layout();
   device.Uninstall("ghost");
-  EXPECT_EQ(before, Tables());
+  EXPECT_EQ(before, db->Layout());
 }
 
 // ---- Event streams the platform may send.
@@ -165,39 +165,35 @@ TEST_F(PackageOperationsTest, OnlyTheLatestStartOfAPackageIsProcessed) {
   EXPECT_TRUE(packages.m_pkgJobMap.empty());
 }
 
-TEST_F(PackageOperationsTest, AFailedOperationLeavesNoTrace) {
+// Streams that end in nothing to do: each is logged as it comes, and the
+// layout stays as it was.
+TEST_F(PackageOperationsTest, StreamsWithNothingToDoAreLoggedAndChangeNothing) {
+  const int kInstall = PACKAGE_MANAGER_EVENT_TYPE_INSTALL;
+  const int kStarted = PACKAGE_MANAGER_EVENT_STATE_STARTED;
+  const int kCompleted = PACKAGE_MANAGER_EVENT_STATE_COMPLETED;
+  struct {
+    const char* name;
+    std::vector<std::pair<int, int>> events;  // type, state
+    Lines logs;
+  } cases[] = {
+      {"failed", {{kInstall, kStarted}, {kInstall, PACKAGE_MANAGER_EVENT_STATE_FAILED},
+                  {kInstall, kCompleted}}, {"E #Step 1"}},
+      {"never started", {{kInstall, kCompleted}}, {"E #Step 1"}},
+      {"unknown type", {{7, kStarted}, {7, kCompleted}},
+       {"E Invalid event_type: 7\n", "E #Step 1", "E #Step 2", "E #Step 3 size[0]"}},
+      {"unknown states", {{kInstall, 9}, {-1, -100}},
+       {"E Invalid event_state: 9\n", "E Invalid event_state: -100\n"}},
+  };
   StartWithFiveGames();
-  std::vector<Row> before = Tables();
-  Emit("bravo", PACKAGE_MANAGER_EVENT_TYPE_UNINSTALL, PACKAGE_MANAGER_EVENT_STATE_STARTED);
-  Emit("bravo", PACKAGE_MANAGER_EVENT_TYPE_UNINSTALL, PACKAGE_MANAGER_EVENT_STATE_FAILED);
-  device.ClearLogs();
-  Emit("bravo", PACKAGE_MANAGER_EVENT_TYPE_UNINSTALL, PACKAGE_MANAGER_EVENT_STATE_COMPLETED);
-  EXPECT_EQ(Lines{"E #Step 1"}, EngineMessages());
-  EXPECT_EQ(before, Tables());
-}
-
-TEST_F(PackageOperationsTest, UnknownTypesAndStatesAreLoggedAndChangeNothing) {
-  StartWithFiveGames();
-  std::vector<Row> before = Tables();
-  device.ClearLogs();
-  Emit("alpha", 7, PACKAGE_MANAGER_EVENT_STATE_STARTED);
-  Emit("alpha", 7, PACKAGE_MANAGER_EVENT_STATE_COMPLETED);
-  Emit("alpha", PACKAGE_MANAGER_EVENT_TYPE_INSTALL, 9);
-  Emit("alpha", -1, -100);
-  EXPECT_EQ((Lines{"E Invalid event_type: 7\n", "E #Step 1", "E #Step 2", "E #Step 3 size[0]",
-                   "E Invalid event_state: 9\n", "E Invalid event_state: -100\n"}),
-            EngineMessages());
-  EXPECT_EQ(before, Tables());
-}
-
-TEST_F(PackageOperationsTest, ACompletionNeverStartedIsIgnored) {
-  StartWithFiveGames();
-  std::vector<Row> before = Tables();
   device.AddGame("stranger", "Stranger");
-  device.ClearLogs();
-  Emit("stranger", PACKAGE_MANAGER_EVENT_TYPE_INSTALL, PACKAGE_MANAGER_EVENT_STATE_COMPLETED);
-  EXPECT_EQ(Lines{"E #Step 1"}, EngineMessages());
-  EXPECT_EQ(before, Tables());
+  std::vector<Row> before = db->Layout();
+  for (const auto& c : cases) {
+    SCOPED_TRACE(c.name);
+    device.ClearLogs();
+    for (const auto& event : c.events) Emit("stranger", event.first, event.second);
+    EXPECT_EQ(c.logs, EngineMessages());
+    EXPECT_EQ(before, db->Layout());
+  }
 }
 
 // Package ids as the platform might send them: the event path neither
@@ -221,7 +217,7 @@ TEST_F(PackageOperationsTest, HostileIdsAreHandledAndStoredByteForByte) {
   }
 
   // Ids that name nothing, or nothing at all.
-  std::vector<Row> before = Tables();
+  std::vector<Row> before = db->Layout();
   for (const char* id : {"", "never.installed"}) {
     for (int type : {PACKAGE_MANAGER_EVENT_TYPE_INSTALL, PACKAGE_MANAGER_EVENT_TYPE_UPDATE,
                      PACKAGE_MANAGER_EVENT_TYPE_UNINSTALL}) {
@@ -235,7 +231,7 @@ TEST_F(PackageOperationsTest, HostileIdsAreHandledAndStoredByteForByte) {
         static_cast<package_manager_event_state_e>(state), 0, PACKAGE_MANAGER_ERROR_NONE,
         &packages);
   }
-  EXPECT_EQ(before, Tables());
+  EXPECT_EQ(before, db->Layout());
   EXPECT_EQ("ok", db->Value("PRAGMA integrity_check"));
 }
 

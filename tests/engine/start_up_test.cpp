@@ -53,16 +53,9 @@ TEST_F(StartUpTest, AStartOnAPopulatedDatabaseWritesNothing) {
   AddGames({"Alpha", "Beta"});
   {
     // A launcher that ran before, with a layout its user arranged.
-    SqlProbe before(DbPath());
-    before.Exec(
-        "PRAGMA journal_mode = PERSIST;"
-        "CREATE TABLE Menus( menuId INTEGER PRIMARY KEY AUTOINCREMENT, name TEXT, type INTEGER );"
-        "CREATE TABLE Pages( pageId INTEGER PRIMARY KEY AUTOINCREMENT, isFolder INTEGER, "
-        "parentId INTEGER, pageNo INTEGER );"
-        "CREATE TABLE Boxes( boxId INTEGER PRIMARY KEY AUTOINCREMENT, isFolder INTEGER, "
-        "pageParentId INTEGER, pageId INTEGER, appId TEXT, name TEXT, col INTEGER, row INTEGER, "
-        "isPreload INTEGER, isSystem INTEGER, boxType INTEGER, launchType INTEGER, iconPath "
-        "TEXT, content TEXT );"
+    LauncherDataManager earlier;
+    earlier._OpenDb();
+    SqlProbe(DbPath()).Exec(
         "INSERT INTO Menus(name, type) VALUES('Apps', 0);"
         "INSERT INTO Pages(isFolder, parentId, pageNo) VALUES(0, 1, 1);"
         "INSERT INTO Boxes(isFolder, pageId, appId, col, row) VALUES(0, 1, 'beta', 3, 2);");
@@ -125,16 +118,6 @@ TEST_F(StartUpTest, StartingTwiceRepeatsTheStepsWithoutDoublingAnything) {
 
   device.Install(Game("beta", "Beta"));
   EXPECT_EQ((Lines{"alpha 1,1", "beta 2,1"}), Page(1));
-}
-
-TEST_F(StartUpTest, UninitializationChangesNothing) {
-  data_engin_uninitialization();
-  AddGames({"Alpha"});
-  Start();
-  data_engin_uninitialization();
-  device.Install(Game("beta", "Beta"));
-  EXPECT_EQ((Lines{"alpha 1,1", "beta 2,1"}), Page(1));
-  EXPECT_EQ(1, korrin_data_probe());
 }
 
 TEST_F(StartUpTest, AfterTerminateNoPackageIsHeardAndASecondTerminateFindsNothingToDo) {

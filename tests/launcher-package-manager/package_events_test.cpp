@@ -135,23 +135,6 @@ TEST_F(PackageEventsTest, UninstallTellsOfTheAppsSeenAtItsStartThenOfDeactivated
   }
 }
 
-TEST_F(PackageEventsTest, NullPackageIdIsTakenAsEmpty) {
-  Listen();
-  for (package_manager_event_state_e state :
-       {PACKAGE_MANAGER_EVENT_STATE_STARTED, PACKAGE_MANAGER_EVENT_STATE_COMPLETED}) {
-    LauncherPackageManager::_PkgMgrClientListenCb("tpk", NULL, PACKAGE_MANAGER_EVENT_TYPE_UNINSTALL,
-                                                  state, 0, PACKAGE_MANAGER_ERROR_NONE, &manager);
-    EXPECT_EQ(state == PACKAGE_MANAGER_EVENT_STATE_STARTED ? 1u : 0u,
-              manager.m_pkgJobMap.count(""));
-  }
-  EXPECT_EQ(Ids{}, Heard());
-  EXPECT_EQ(
-      (Ids{"E BEGIN", "E package_manager_get_package_info[(null)] != PACKAGE_MANAGER_ERROR_NONE",
-           "E END", "E #Step 1", "E #Step 2", "E #Step 3 size[0]"}),
-      EngineMessages());
-  EXPECT_EQ(0, LeftOpen());
-}
-
 TEST_F(PackageEventsTest, PausedCompletionsReplayInCompletionOrderOnceUnpaused) {
   device.AddPackage(sim::MakePackage("com.ex.a", {sim::GameApp("com.ex.a", "A")}));
   device.AddPackage(sim::MakePackage("com.ex.b", {sim::GameApp("com.ex.b", "B")}));
@@ -202,28 +185,6 @@ TEST_F(PackageEventsTest, AReplayThatACallbackPausesOrRestartsRunsNoJobTwice) {
   EXPECT_EQ(Ids{"com.ex.d"}, Heard());
   ASSERT_EQ(1u, manager.m_pkgJobList.size());
   EXPECT_EQ("com.ex.e", manager.m_pkgJobList[0]->pkgId);
-}
-
-TEST_F(PackageEventsTest, EventsAreHeardFromInitializeUntilTerminateAndNeverWithoutAClient) {
-  EXPECT_EQ(0, device.PackageListeners());
-  EXPECT_TRUE(Listen());
-  EXPECT_EQ(1, device.PackageListeners());
-  device.Install(sim::MakePackage("com.ex.a", {sim::GameApp("com.ex.a", "A")}));
-  EXPECT_EQ(Ids{"installed com.ex.a"}, Heard());
-
-  EXPECT_TRUE(manager.Terminate());
-  EXPECT_EQ(0, device.PackageListeners());
-  device.ClearLogs();
-  device.Install(sim::MakePackage("com.ex.b", {sim::GameApp("com.ex.b", "B")}));
-
-  device.FailNext("package_manager_create", PACKAGE_MANAGER_ERROR_IO_ERROR);
-  LauncherPackageManager without;
-  EXPECT_TRUE(Listen(without));
-  EXPECT_EQ(0, device.PackageListeners());
-  device.Install(sim::MakePackage("com.ex.c", {sim::GameApp("com.ex.c", "C")}));
-  EXPECT_EQ(Ids{}, Heard());
-  EXPECT_TRUE(EngineMessages().empty());
-  EXPECT_EQ(0, HandlesOpenedByTest());
 }
 
 }  // namespace

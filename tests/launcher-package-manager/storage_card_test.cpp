@@ -100,26 +100,6 @@ TEST_F(StorageCardTest, CardStatusSetsOnlyTheInsertedFlag) {
   }
 }
 
-TEST_F(StorageCardTest, WalkFiresNothingWithoutCardAppsAndSurvivesRefreshedEntries) {
-  AddCachedGame("com.ex.home");
-  manager.OnMMCStatusChanged(1);
-  EXPECT_TRUE(manager.m_isMmcInserted);
-  EXPECT_EQ(Ids{}, refreshed);
-
-  // The engine's refresh reads the application again, which replaces (and
-  // frees) the very record the walk came from.
-  AddCardGame("com.ex.b");
-  AddCardGame("com.ex.a");
-  manager.m_onStorageCardAppChanged = [this](const char* appId) {
-    ASSERT_TRUE(manager._GetAppInfo(appId, NewBox()));
-    refreshed.push_back(appId);
-  };
-  manager.OnMMCStatusChanged(0);
-  EXPECT_FALSE(manager.m_isMmcInserted);
-  EXPECT_EQ((Ids{"com.ex.a", "com.ex.b"}), refreshed);
-  EXPECT_FALSE(manager.m_appInfoCache.at("com.ex.a")->isOnStorageCard);
-}
-
 TEST_F(StorageCardTest, FailedSubscriptionKeepsNoBus) {
   struct {
     const char* call;

@@ -34,6 +34,17 @@ std::string SqlProbe::Value(const std::string& sql) {
   return rows.empty() || rows[0].empty() ? "" : rows[0][0];
 }
 
+std::vector<Row> SqlProbe::Layout() {
+  std::vector<Row> rows;
+  for (const char* sql :
+       {"SELECT * FROM Menus ORDER BY menuId", "SELECT * FROM Pages ORDER BY pageId",
+        "SELECT * FROM Boxes ORDER BY boxId"}) {
+    std::vector<Row> more = Rows(sql);
+    rows.insert(rows.end(), more.begin(), more.end());
+  }
+  return rows;
+}
+
 void SqlProbe::Exec(const std::string& sql) {
   char* error = NULL;
   if (sqlite3_exec(m_db, sql.c_str(), NULL, NULL, &error) != SQLITE_OK) {

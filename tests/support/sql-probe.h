@@ -19,6 +19,9 @@ class SqlProbe {
   std::vector<Row> Rows(const std::string& sql);
   // Column 0 of the first row of |sql|, or "" without a row.
   std::string Value(const std::string& sql);
+  // Every row of Menus, Pages and Boxes, in that order and by id: the whole
+  // layout, to show that nothing was written.
+  std::vector<Row> Layout();
   // Runs |sql|; fails the test when it does not succeed.
   void Exec(const std::string& sql);
   // Runs |sql| and returns SQLite's result code.
