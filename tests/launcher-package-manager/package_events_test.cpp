@@ -72,18 +72,6 @@ TEST_F(PackageEventsTest, OneInstallLogsEachStep) {
   EXPECT_EQ(0, LeftOpen());
 }
 
-TEST_F(PackageEventsTest, InstallTellsOfEachEnabledAppInTheOrderThePackageListsThem) {
-  Listen();
-  sim::Package pack = Pack({"com.ex.pack.b", "com.ex.pack.off", "com.ex.pack.a"});
-  pack.apps[1].enabled = false;
-  device.Install(pack);
-  EXPECT_EQ((Ids{"installed com.ex.pack.b", "installed com.ex.pack.a"}), Heard());
-  // The disabled application is read and logged like the others, then passed over.
-  Ids logs = EngineMessages();
-  EXPECT_EQ(1, std::count(logs.begin(), logs.end(), "E appId[com.ex.pack.off] mdm is not enabled"));
-  EXPECT_EQ(0, LeftOpen());
-}
-
 TEST_F(PackageEventsTest, UpdateTellsOfUpdatedAppsAndOfAppsItDisabledAsUninstalled) {
   device.AddPackage(Pack({"com.ex.pack.a", "com.ex.pack.b", "com.ex.pack.c"}));
   Cache("com.ex.pack.a");
