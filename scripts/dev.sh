@@ -8,7 +8,10 @@
 set -euo pipefail
 cd "$(dirname "$0")/.."
 
-packages=(g++ make cmake pkg-config libsqlite3-dev libboost-dev libgtest-dev libgmock-dev)
+# The library needs SQLite and Boost's headers; korrin-sim adds
+# Boost.Program_options, libedit and dtl; the tests GoogleTest and GoogleMock.
+packages=(g++ make cmake pkg-config libsqlite3-dev libboost-dev libboost-program-options-dev
+          libedit-dev libdtl-dev libgtest-dev libgmock-dev)
 
 install_missing_packages() {
   local missing=() p

@@ -1,130 +1,164 @@
 // korrin-sim: the engine on a simulated device, for launcher engineers at a
-// workstation.
-//
-//   korrin-sim demo [--root DIR]   a phone with a few dozen games: the engine
-//                                  starts (first launch lays the games out),
-//                                  a game is installed, and the home screen
-//                                  is shown after each step
+// workstation. It plays the demo story, scenario scripts, or commands typed
+// into a shell; `korrin-sim --help` lists the commands.
 #include <errno.h>
 #include <stdlib.h>
 #include <string.h>
+#include <unistd.h>
+
+#include <editline/readline.h>
 
 #include <filesystem>
+#include <fstream>
 #include <iostream>
+#include <sstream>
 #include <string>
 #include <vector>
 
-#include "common/device-path.h"
-#include "korrin-data/korrin-data.h"
+#include <boost/program_options.hpp>
+
+#include "cli.h"
+#include "demo-story.h"
+#include "session.h"
 #include "sim/device.h"
+
+namespace po = boost::program_options;
 
 namespace {
 
-const int kCellWidth = 16;  // four cells and the row number fit 80 columns
-
-int Usage() {
-  std::cerr << "usage: korrin-sim demo [--root DIR]\n";
-  return 2;
-}
-
-// |text| cut or padded to |width| characters (UTF-8 aware).
-std::string Cell(const std::string& text, size_t width) {
-  std::string out;
-  size_t chars = 0;
-  for (size_t i = 0; i < text.size() && chars < width; ++chars) {
-    size_t length = 1;
-    while (i + length < text.size() && (text[i + length] & 0xC0) == 0x80) ++length;
-    out += text.substr(i, length);
-    i += length;
-  }
-  return out + std::string(width - chars, ' ');
-}
-
-// What the launcher shows for a box: its stored name, or else the label the
-// platform gives its application.
-std::string Label(LauncherPackageManager& packages, const GameBoxData& box) {
-  if (!box.name.empty()) return box.name;
-  boost::shared_ptr<GameBoxData> info(new GameBoxData(box));
-  return packages.GetAppInfo(box.appId, info) ? info->name : box.appId;
-}
-
-// The pages of menu 1 as grids of four columns, one box name per cell.
-void PrintHomeScreen(LauncherDataManager& store, LauncherPackageManager& packages) {
-  std::vector<boost::shared_ptr<GamePageData> > pages = store.GetPageDataList(1, false);
-  for (size_t p = 0; p < pages.size(); ++p) {
-    std::cout << "  page " << pages[p]->pageNo << "\n";
-    std::vector<boost::shared_ptr<GameBoxData> > boxes = store.GetBoxDataList(pages[p]->pageId);
-    int row = 0;
-    for (size_t b = 0; b < boxes.size(); ++b) {
-      if (boxes[b]->row != row) {
-        if (row != 0) std::cout << "\n";
-        row = boxes[b]->row;
-        std::cout << "  " << Cell(std::to_string(row), 3);
-      }
-      std::cout << "| " << Cell(Label(packages, *boxes[b]), kCellWidth);
-    }
-    std::cout << "\n";
-  }
-}
-
-int Demo(std::string root) {
-  bool temporary = root.empty();
-  if (temporary) {
+// Lays out the device under |root|, or under a fresh temporary folder when
+// |root| is empty (then |root| becomes its path). False, said on stderr, when
+// that cannot be done.
+bool UseDeviceRoot(std::string& root) {
+  if (root.empty()) {
     char pattern[] = "/tmp/korrin-sim-XXXXXX";
     if (mkdtemp(pattern) == NULL) {
       std::cerr << "korrin-sim: cannot make a device root: " << strerror(errno) << "\n";
-      return 1;
+      return false;
     }
     root = pattern;
   }
-  sim::Device& device = sim::Device::Get();
-  if (!device.UseRoot(root)) {
+  if (!sim::Device::Get().UseRoot(root)) {
     std::cerr << "korrin-sim: cannot lay out a device under " << root << "\n";
-    return 1;
+    return false;
   }
-  device.LoadSampleDevice();
+  return true;
+}
 
-  int status = 0;
-  {
-    // The launcher's own start: the engine lays the games out on first launch.
-    data_engin_initialization();
-    LauncherDataManager& store = korrin::DataManager();
-    LauncherPackageManager& packages = korrin::PackageManager();
-    if (store.m_db == NULL) {
-      for (const sim::LogLine& line : device.Logs()) std::cerr << line.text << "\n";
+int Demo(std::string root) {
+  if (!UseDeviceRoot(root)) return 1;
+  std::cout << "device root: " << root << "\n\n";
+  korrin_sim::Session session(/*printActions=*/false);
+  std::istringstream story(kDemoStory);
+  return session.RunScript(story, "demo", std::cerr) ? 0 : 1;
+}
+
+int Run(std::string root, const std::vector<std::string>& files) {
+  if (files.empty()) {
+    std::cerr << "korrin-sim: run what? usage: korrin-sim run [--root DIR] FILE...\n";
+    return 2;
+  }
+  bool temporary = root.empty();
+  if (!UseDeviceRoot(root)) return 1;
+  korrin_sim::Session session;
+  for (const std::string& file : files) {
+    std::ifstream in(file);
+    if (!in) {
+      std::cerr << "korrin-sim: cannot read " << file << ": " << strerror(errno) << "\n";
       return 1;
     }
-    std::cout << "device root: " << root << "\n"
-              << "layout database: " << korrin::DevicePath(korrin::kGameDataDbPath) << "\n";
-
-    std::cout << "\nfirst launch: every displayable game gets a box in menu \"Apps\":\n";
-    PrintHomeScreen(store, packages);
-
-    device.Install(sim::MakePackage("com.lumaforge.skyharbor",
-                                    {sim::GameApp("com.lumaforge.skyharbor", "Sky Harbor")}));
-    std::cout << "\nSky Harbor installed: its box goes after the last one:\n";
-    PrintHomeScreen(store, packages);
-
-    std::vector<std::string> deactivated = packages._GetDeactivatedAppIds();
-    std::cout << "\ndeactivated applications:";
-    for (size_t i = 0; i < deactivated.size(); ++i) std::cout << " " << deactivated[i];
-    std::cout << "\n";
+    if (!session.RunScript(in, file, std::cerr)) {
+      if (temporary) std::cerr << "korrin-sim: the device is left in " << root << "\n";
+      return 1;
+    }
   }
   if (temporary) std::filesystem::remove_all(root);
-  return status;
+  return 0;
+}
+
+// One line from the terminal with editing and history, or from a pipe.
+bool ReadLine(const char* prompt, std::string& line) {
+  if (!isatty(STDIN_FILENO)) return static_cast<bool>(std::getline(std::cin, line));
+  char* text = readline(prompt);
+  if (text == NULL) return false;
+  line = text;
+  free(text);
+  if (!line.empty()) add_history(line.c_str());
+  return true;
+}
+
+int Shell(std::string root) {
+  if (!UseDeviceRoot(root)) return 1;
+  std::cout << "korrin-sim shell on the device in " << root
+            << "\n`help` lists the commands; Ctrl-D ends.\n";
+  const char* home = getenv("HOME");
+  std::string history = std::string(home != NULL ? home : ".") + "/.korrin_sim_history";
+  read_history(history.c_str());
+  korrin_sim::Session session;
+  std::string line;
+  while (ReadLine("korrin> ", line)) {
+    try {
+      if (line.find_first_not_of(" \t") != std::string::npos &&
+          line.substr(line.find_first_not_of(" \t")) == "expect") {
+        std::vector<std::string> block;
+        while (ReadLine("  ...> ", line) && line.find_first_not_of(" \t") != std::string::npos &&
+               line != "end") {
+          block.push_back(line);
+        }
+        session.Expect(block);
+        std::cout << "as expected\n";
+      } else {
+        session.Execute(line);
+      }
+    } catch (const std::exception& e) {
+      std::cout << std::flush;
+      std::cerr << e.what() << std::endl;
+    }
+  }
+  write_history(history.c_str());
+  return 0;
 }
 
 }  // namespace
 
 int main(int argc, char** argv) {
-  if (argc < 2 || strcmp(argv[1], "demo") != 0) return Usage();
-  std::string root;
-  for (int i = 2; i < argc; ++i) {
-    if (strcmp(argv[i], "--root") == 0 && i + 1 < argc) {
-      root = argv[++i];
-    } else {
-      return Usage();
+  po::options_description visible("options");
+  visible.add_options()("root", po::value<std::string>()->value_name("DIR"),
+                        "keep the device (and its database) in DIR")("help", "list the commands");
+  po::options_description all;
+  all.add(visible).add_options()("mode", po::value<std::string>()->default_value("demo"))(
+      "files", po::value<std::vector<std::string> >());
+  po::positional_options_description order;
+  order.add("mode", 1).add("files", -1);
+  po::variables_map values;
+  try {
+    po::store(po::command_line_parser(argc, argv).options(all).positional(order).run(), values);
+    po::notify(values);
+  } catch (const po::error& e) {
+    std::cerr << "korrin-sim: " << e.what() << " (korrin-sim --help)\n";
+    return 2;
+  }
+  std::string mode = values["mode"].as<std::string>();
+  std::string root = values.count("root") ? values["root"].as<std::string>() : "";
+  std::vector<std::string> files =
+      values.count("files") ? values["files"].as<std::vector<std::string> >()
+                            : std::vector<std::string>();
+  if (values.count("help") || (mode == "help" && files.empty())) {
+    korrin_sim::PrintCommandList(std::cout);
+    return 0;
+  }
+  if (mode == "help" && files.size() == 1) {
+    try {
+      korrin_sim::PrintCommandHelp(files[0], std::cout);
+      return 0;
+    } catch (const korrin_sim::UsageError& e) {
+      std::cerr << "korrin-sim: " << e.what() << "\n";
+      return 2;
     }
   }
-  return Demo(root);
+  if (mode == "demo" && files.empty()) return Demo(root);
+  if (mode == "run") return Run(root, files);
+  if (mode == "shell" && files.empty()) return Shell(root);
+  std::cerr << "korrin-sim: unknown mode or extra words (korrin-sim --help)\n";
+  return 2;
 }

@@ -1,0 +1,39 @@
+// What the parts of korrin-sim share: the error a bad command raises, the
+// stream a command prints to, and the way values are read and written.
+#ifndef KORRIN_SIM_CLI_H_
+#define KORRIN_SIM_CLI_H_
+
+#include <ostream>
+#include <stdexcept>
+#include <string>
+#include <vector>
+
+namespace korrin_sim {
+
+// A command that cannot run as written: unknown, or with an argument that
+// does not parse. Raised before the command changes anything.
+class UsageError : public std::runtime_error {
+ public:
+  explicit UsageError(const std::string& what) : std::runtime_error(what) {}
+};
+
+// Where the command being run prints. Callbacks that the engine fires later,
+// in the middle of another command, print here too.
+std::ostream& Out();
+// Points Out() at |out| (null: standard output).
+void SetOut(std::ostream* out);
+
+// Values as scripts write them. Each throws UsageError naming |what| (the
+// argument's name) when |text| is not such a value.
+int ParseInt(const std::string& text, const std::string& what);
+long long ParseInt64(const std::string& text, const std::string& what);
+unsigned int ParseUnsigned(const std::string& text, const std::string& what);
+bool ParseBool(const std::string& text, const std::string& what);  // true|false|1|0
+
+// A text value as results print it: in double quotes, with \" and \\ escaped
+// and other bytes below 0x20 as \n, \t or \xHH.
+std::string Quote(const std::string& text);
+
+}  // namespace korrin_sim
+
+#endif  // KORRIN_SIM_CLI_H_

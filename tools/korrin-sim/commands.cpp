@@ -1,0 +1,670 @@
+#include "commands.h"
+
+#include <package_manager.h>
+
+#include <algorithm>
+#include <sstream>
+#include <stdexcept>
+
+#include "calls.h"
+#include "cli.h"
+#include "korrin-data/korrin-data.h"
+#include "session.h"
+#include "sim/device.h"
+#include "views.h"
+
+namespace po = boost::program_options;
+
+namespace korrin_sim {
+
+namespace {
+
+sim::Device& Dev() { return sim::Device::Get(); }
+
+// ---- Values that scripts name.
+
+// |text| as one of |names| (their index), or as any integer when |numbers|.
+int ParseNamed(const std::string& text, const std::vector<std::string>& names,
+               const std::string& what, bool numbers = false) {
+  std::vector<std::string>::const_iterator it = std::find(names.begin(), names.end(), text);
+  if (it != names.end()) return static_cast<int>(it - names.begin());
+  std::string all;
+  for (const std::string& name : names) all += (all.empty() ? "" : "|") + name;
+  if (!numbers) throw UsageError(what + ": '" + text + "' is not " + all);
+  try {
+    return ParseInt(text, what);
+  } catch (const UsageError&) {
+    throw UsageError(what + ": '" + text + "' is not " + all + " or a number");
+  }
+}
+
+const std::vector<std::string> kEventTypes = {"install", "uninstall", "update"};
+const std::vector<std::string> kEventStates = {"started", "processing", "completed", "failed"};
+const std::vector<std::string> kComponents = {"all", "ui", "service"};
+
+mdm_status_t ParseMdmState(const std::string& text) {
+  if (text == "error") return MDM_STATUS_ERROR;
+  return static_cast<mdm_status_t>(ParseNamed(text, {"allowed", "restricted"}, "state", true));
+}
+
+// ---- Package and application properties, as options.
+
+void AddPackageOptions(po::options_description& options) {
+  options.add_options()
+      ("pkg-type", po::value<std::string>()->value_name("TYPE"),
+       "package type events report (tpk)")
+      ("system", po::value<bool>()->implicit_value(true)->value_name("BOOL"),
+       "a system package")
+      ("removable", po::value<bool>()->implicit_value(true)->value_name("BOOL"),
+       "the user may remove it (true)")
+      ("preload", po::value<bool>()->implicit_value(true)->value_name("BOOL"),
+       "came with the device")
+      ("support-disable", po::value<bool>()->implicit_value(true)->value_name("BOOL"),
+       "the user may deactivate it")
+      ("disabled", po::value<bool>()->implicit_value(true)->value_name("BOOL"),
+       "deactivated");
+}
+
+void AddAppOptions(po::options_description& options) {
+  options.add_options()
+      ("label", po::value<std::string>()->value_name("TEXT"), "the label")
+      ("no-label", po::bool_switch(), "the platform gives no label")
+      ("icon", po::value<std::string>()->value_name("PATH"), "the icon path")
+      ("no-icon", po::bool_switch(), "the platform gives no icon path")
+      ("type", po::value<std::string>()->value_name("TYPE"), "application type (capp)")
+      ("game", po::value<bool>()->implicit_value(true)->value_name("BOOL"), "a game")
+      ("no-display", po::value<bool>()->implicit_value(true)->value_name("BOOL"),
+       "never shown in menus")
+      ("enabled", po::value<bool>()->implicit_value(true)->value_name("BOOL"),
+       "enabled (true)")
+      ("task-manage", po::value<bool>()->implicit_value(true)->value_name("BOOL"),
+       "shown in the task manager (true)")
+      ("component", po::value<std::string>()->value_name("ui|service|all"),
+       "component type (ui)")
+      ("category", po::value<std::vector<std::string> >()->value_name("URI"),
+       "a category (repeat for more)")
+      ("metadata", po::value<std::vector<std::string> >()->value_name("KEY=VALUE"),
+       "a metadata pair (repeat for more)");
+}
+
+template <typename T>
+void Set(const Args& args, const std::string& name, T& field) {
+  if (args.Has(name)) field = args.Get<T>(name);
+}
+
+void ApplyPackageOptions(const Args& args, sim::Package& pkg) {
+  if (args.Has("pkg-type")) pkg.type = args.Text("pkg-type");
+  Set(args, "system", pkg.system);
+  Set(args, "removable", pkg.removable);
+  Set(args, "preload", pkg.preload);
+  Set(args, "support-disable", pkg.supportDisable);
+  Set(args, "disabled", pkg.disabled);
+}
+
+// Throws before |app| changes when an option's value does not parse.
+void ApplyAppOptions(const Args& args, sim::App& app) {
+  sim::App changed = app;
+  if (args.Has("label")) changed.label = args.Text("label");
+  if (args.Get<bool>("no-label")) changed.label.reset();
+  if (args.Has("icon")) changed.icon = args.Text("icon");
+  if (args.Get<bool>("no-icon")) changed.icon.reset();
+  if (args.Has("type")) changed.type = args.Text("type");
+  Set(args, "game", changed.game);
+  Set(args, "no-display", changed.noDisplay);
+  Set(args, "enabled", changed.enabled);
+  Set(args, "task-manage", changed.taskManage);
+  if (args.Has("component")) {
+    changed.component = static_cast<package_info_app_component_type_e>(
+        ParseNamed(args.Text("component"), kComponents, "--component", true));
+  }
+  if (args.Has("category")) changed.categories = args.List("category");
+  if (args.Has("metadata")) {
+    changed.metadata.clear();
+    for (const std::string& pair : args.List("metadata")) {
+      size_t equals = pair.find('=');
+      if (equals == std::string::npos) {
+        throw UsageError("--metadata: '" + pair + "' is not KEY=VALUE");
+      }
+      changed.metadata.emplace_back(pair.substr(0, equals), pair.substr(equals + 1));
+    }
+  }
+  app = changed;
+}
+
+void AddBothOptions(po::options_description& options) {
+  AddPackageOptions(options);
+  AddAppOptions(options);
+}
+
+// A package PKGID holding one application of the same id: a game labelled
+// LABEL (or PKGID), with the options applied.
+sim::Package OneAppPackage(const Args& args) {
+  std::string id = args.Text("PKGID");
+  sim::Package pkg =
+      sim::MakePackage(id, {sim::GameApp(id, args.Has("LABEL") ? args.Text("LABEL") : id)});
+  ApplyAppOptions(args, pkg.apps[0]);
+  ApplyPackageOptions(args, pkg);
+  return pkg;
+}
+
+// The package an `app` or `package` command describes: a held one, the
+// installed one, or a new one.
+sim::Package DescribedPackage(Session& session, const std::string& id) {
+  if (session.held().count(id)) return session.held()[id];
+  const sim::Package* installed = Dev().FindPackage(id);
+  return installed != NULL ? *installed : sim::MakePackage(id, {});
+}
+
+void Store(Session& session, const sim::Package& pkg, bool hold) {
+  if (hold || session.held().count(pkg.id)) {
+    session.held()[pkg.id] = pkg;
+  } else {
+    Dev().AddPackage(pkg);
+  }
+}
+
+// ---- The commands.
+
+void RunGame(Session&, const Args& args) {
+  sim::Package pkg = sim::MakePackage(
+      args.Text("APPID"), {sim::GameApp(args.Text("APPID"), args.Text("LABEL"))});
+  ApplyAppOptions(args, pkg.apps[0]);
+  ApplyPackageOptions(args, pkg);
+  Dev().AddPackage(pkg);
+}
+
+void RunPackage(Session& session, const Args& args) {
+  sim::Package pkg = DescribedPackage(session, args.Text("PKGID"));
+  ApplyPackageOptions(args, pkg);
+  Store(session, pkg, args.Get<bool>("held"));
+}
+
+void RunApp(Session& session, const Args& args) {
+  sim::Package pkg = DescribedPackage(session, args.Text("PKGID"));
+  std::string appId = args.Text("APPID");
+  std::vector<sim::App>::iterator app = std::find_if(
+      pkg.apps.begin(), pkg.apps.end(), [&](const sim::App& a) { return a.id == appId; });
+  if (app == pkg.apps.end()) {
+    pkg.apps.push_back(sim::PlainApp(appId, appId));
+    app = pkg.apps.end() - 1;
+  }
+  ApplyAppOptions(args, *app);
+  Store(session, pkg, false);
+}
+
+void RunRemove(Session& session, const Args& args) {
+  std::string id = args.Text("PKGID");
+  if (session.held().erase(id) == 0 && !Dev().RemovePackage(id)) {
+    throw UsageError("no package '" + id + "' on the device");
+  }
+}
+
+void RunInstall(Session& session, const Args& args) {
+  std::string id = args.Text("PKGID");
+  bool sendHeld = session.held().count(id) && args.words().size() == 1;
+  sim::Package pkg = sendHeld ? session.held()[id] : OneAppPackage(args);
+  session.held().erase(id);
+  Dev().Install(pkg);
+}
+
+void RunUpdate(Session& session, const Args& args) {
+  std::string id = args.Text("PKGID");
+  sim::Package pkg;
+  if (session.held().count(id) && args.words().size() == 1) {
+    pkg = session.held()[id];
+  } else {
+    const sim::Package* installed = Dev().FindPackage(id);
+    if (installed == NULL) throw UsageError("no package '" + id + "' on the device to update");
+    pkg = *installed;
+    std::string appId = args.Has("app") ? args.Text("app") : id;
+    std::vector<sim::App>::iterator app = std::find_if(
+        pkg.apps.begin(), pkg.apps.end(), [&](const sim::App& a) { return a.id == appId; });
+    if (app == pkg.apps.end() && args.Has("app")) {
+      pkg.apps.push_back(sim::GameApp(appId, appId));
+      app = pkg.apps.end() - 1;
+    } else if (app == pkg.apps.end()) {
+      if (pkg.apps.empty()) throw UsageError("package '" + id + "' has no application");
+      app = pkg.apps.begin();
+    }
+    if (args.Has("LABEL")) app->label = args.Text("LABEL");
+    ApplyAppOptions(args, *app);
+    ApplyPackageOptions(args, pkg);
+  }
+  session.held().erase(id);
+  Dev().Update(pkg);
+}
+
+void RunUninstall(Session&, const Args& args) {
+  if (!Dev().Uninstall(args.Text("PKGID"))) {
+    throw UsageError("no package '" + args.Text("PKGID") + "' on the device");
+  }
+}
+
+void RunEvent(Session&, const Args& args) {
+  int type = ParseNamed(args.Text("EVENT"), kEventTypes, "EVENT", true);
+  int state = ParseNamed(args.Text("STATE"), kEventStates, "STATE", true);
+  Dev().EmitPackageEvent(args.Text("pkg-type"), args.Text("PKGID"), type, state,
+                         args.Get<int>("progress"), args.Get<int>("error"));
+}
+
+void RunBootDone(Session&, const Args&) {
+  int handlers = Dev().SendBusSignal("/Org/Tizen/System/DeviceD/Core",
+                                     "org.tizen.system.deviced.core", "BootingDone");
+  Out() << "BootingDone reached " << handlers << (handlers == 1 ? " handler\n" : " handlers\n");
+}
+
+void RunPreference(Session&, const Args& args) {
+  if (args.Has("VALUE")) {
+    Dev().SetPreference(args.Text("KEY"), ParseInt(args.Text("VALUE"), "VALUE"));
+  } else {
+    Dev().RemovePreference(args.Text("KEY"));
+  }
+}
+
+void RunCard(Session&, const Args& args) {
+  int status = ParseNamed(args.Text("in|out"), {"out", "in"}, "in|out");
+  Dev().SetPreference("memory/sysman/mmc", status);
+}
+
+void RunScreen(Session&, const Args& args) {
+  int width = ParseInt(args.Text("WIDTH"), "WIDTH");
+  int height = ParseInt(args.Text("HEIGHT"), "HEIGHT");
+  Dev().SetSystemInfo("http://tizen.org/feature/screen.width", width);
+  Dev().SetSystemInfo("http://tizen.org/feature/screen.height", height);
+}
+
+void RunMdm(Session&, const Args& args) {
+  bool reachable = ParseNamed(args.Text("reachable|unreachable"), {"unreachable", "reachable"},
+                              "reachable|unreachable");
+  std::map<std::string, mdm_status_t> states;
+  for (const std::string& pair : args.List("APPID=STATE")) {
+    size_t equals = pair.find('=');
+    if (equals == std::string::npos) throw UsageError("'" + pair + "' is not APPID=STATE");
+    states[pair.substr(0, equals)] = ParseMdmState(pair.substr(equals + 1));
+  }
+  Dev().SetMdm(reachable, states);
+}
+
+void RunFail(Session&, const Args& args) {
+  if (args.Text("CALL") == "clear") {
+    if (args.Has("ERROR")) throw UsageError("`fail clear` takes nothing more");
+    Dev().ClearFailures();
+    return;
+  }
+  if (!args.Has("ERROR")) throw UsageError("missing ERROR (usage: fail CALL ERROR [once|always])");
+  std::string call = args.Text("CALL");
+  int error = ParseInt(args.Text("ERROR"), "ERROR");
+  std::string how = args.Has("once|always") ? args.Text("once|always") : "once";
+  bool always = ParseNamed(how, {"once", "always"}, "once|always") != 0;
+  try {
+    if (always) {
+      Dev().FailAlways(call, error);
+    } else {
+      Dev().FailNext(call, error, args.Get<int>("skip"));
+    }
+  } catch (const std::invalid_argument&) {
+    throw UsageError("'" + call + "' is not a platform call the device knows");
+  }
+}
+
+void RunStart(Session&, const Args&) { data_engin_initialization(); }
+
+void RunStop(Session&, const Args&) { data_engin_uninitialization(); }
+
+void RunCall(Session&, const Args& args) {
+  if (args.words().empty()) throw UsageError("call what? `help call` lists the operations");
+  if (args.words()[0] == "--list") {
+    if (args.words().size() > 1) throw UsageError("--list takes nothing more");
+    ListCalls(Out());
+  } else {
+    Call(args.words(), Out());
+  }
+}
+
+void RunOnCard(Session&, const Args& args) {
+  std::vector<std::string> appIds = args.List("APPID");
+  for (const std::string& appId : appIds) {
+    if (Dev().FindApp(appId) == NULL) throw UsageError("no application '" + appId + "'");
+  }
+  LauncherPackageManager& packages = korrin::PackageManager();
+  for (const std::string& appId : appIds) {
+    boost::shared_ptr<GameBoxData> info = packages.m_appInfoCache[appId];
+    if (!info) {
+      packages.m_appInfoCache.erase(appId);
+      info.reset(new GameBoxData());
+      if (!packages.GetAppInfo(appId, info)) {
+        Out() << appId << ": its information cannot be read\n";
+        continue;
+      }
+      info = packages.m_appInfoCache[appId];
+    }
+    info->isOnStorageCard = true;
+  }
+}
+
+void RunBefore(Session& session, const Args& args) {
+  std::string rest = args.rest();
+  std::string call = rest.substr(0, rest.find_first_of(" \t"));
+  std::string line = rest.size() > call.size() ? rest.substr(call.size() + 1) : "";
+  if (call.empty() || line.find_first_not_of(" \t") == std::string::npos) {
+    throw UsageError("usage: before CALL COMMAND...");
+  }
+  session.Check(line);
+  try {
+    Dev().BeforeNext(call, [&session, line]() { session.Execute(line); });
+  } catch (const std::invalid_argument&) {
+    throw UsageError("'" + call + "' is not a platform call the device knows");
+  }
+}
+
+void RunSampleDevice(Session&, const Args&) { Dev().LoadSampleDevice(); }
+
+void RunSay(Session&, const Args& args) { Out() << args.rest() << "\n"; }
+
+void RunLayout(Session& session, const Args& args) {
+  int menuId = args.Has("MENUID") ? ParseInt(args.Text("MENUID"), "MENUID") : 1;
+  PrintMenuLayout(session.DatabasePath(), menuId, args.Get<bool>("ids"), Out());
+}
+
+void RunFolder(Session& session, const Args& args) {
+  PrintFolder(session.DatabasePath(), ParseInt(args.Text("BOXID"), "BOXID"),
+              args.Get<bool>("ids"), Out());
+}
+
+LauncherDataManager& StartedStore() {
+  if (korrin::DataManager().m_db == NULL) {
+    throw UsageError("the engine has no database open: `start` it first");
+  }
+  return korrin::DataManager();
+}
+
+// Computed pages and the boxes on them, drawn page by page.
+void PrintComputedView(const std::vector<boost::shared_ptr<GamePageData> >& pages,
+                       const std::vector<boost::shared_ptr<GameBoxData> >& boxes, int columns) {
+  if (pages.empty()) Out() << " (no pages)\n";
+  for (const boost::shared_ptr<GamePageData>& page : pages) {
+    Out() << "page " << page->pageNo << " (pageId " << page->pageId << ")\n";
+    std::vector<GridBox> grid;
+    for (const boost::shared_ptr<GameBoxData>& box : boxes) {
+      if (box->pageId != page->pageId) continue;
+      grid.push_back(GridBox{box->col, box->row,
+                             BoxLabel(box->isFolder, box->boxType, box->appId, box->name)});
+    }
+    PrintGrid(grid, columns, 0, Out());
+  }
+}
+
+void RunDownloads(Session&, const Args&) {
+  LauncherDataManager& store = StartedStore();
+  PrintComputedView(store.GetPageDataListByDownload(1, false),
+                    store.GetBoxDataListByDownload(1, false), 4);
+}
+
+void RunAlphabetical(Session&, const Args& args) {
+  int parentId = args.Has("PARENTID") ? ParseInt(args.Text("PARENTID"), "PARENTID") : 1;
+  bool folder = args.Get<bool>("folder");
+  LauncherDataManager& store = StartedStore();
+  PrintComputedView(store.GetPageDataListByAlphabeticalOrder(parentId, folder),
+                    store.GetBoxDataListByAlphabeticalOrder(parentId, folder), folder ? 3 : 4);
+}
+
+// dlog priorities by letter, lowest first, from DLOG_VERBOSE (2).
+const std::string kPriorities = "VDIWEF";
+
+char PriorityLetter(int priority) {
+  int index = priority - 2;
+  return index >= 0 && index < static_cast<int>(kPriorities.size()) ? kPriorities[index] : '?';
+}
+
+// The text after the engine's "file: function(line) >  " prefix.
+std::string Message(const std::string& text) {
+  size_t end = text.find(") >  ");
+  return end == std::string::npos ? text : text.substr(end + 5);
+}
+
+void RunLog(Session& session, const Args& args) {
+  int lowest = 0;
+  if (args.Has("priority")) {
+    std::string letter = args.Text("priority");
+    size_t index = kPriorities.find(letter);
+    if (letter.size() != 1 || index == std::string::npos) {
+      throw UsageError("--priority: '" + letter + "' is not one of V D I W E F");
+    }
+    lowest = static_cast<int>(index) + 2;
+  }
+  const std::vector<sim::LogLine>& lines = Dev().Logs();
+  size_t first = args.Get<bool>("all") ? 0 : std::min(session.logMark(), lines.size());
+  for (size_t i = first; i < lines.size(); ++i) {
+    const sim::LogLine& line = lines[i];
+    if (line.priority < lowest) continue;
+    if (args.Has("grep") && line.text.find(args.Text("grep")) == std::string::npos) continue;
+    std::string text = args.Get<bool>("message") ? Message(line.text) : line.text;
+    if (!text.empty() && text.back() == '\n') text.pop_back();
+    Out() << PriorityLetter(line.priority) << "/" << line.tag << ": " << text << "\n";
+  }
+}
+
+void RunTables(Session& session, const Args& args) {
+  PrintTables(session.DatabasePath(), args.List("TABLE"), Out());
+}
+
+void RunChanges(Session& session, const Args&) {
+  PrintChanges(session.before(), session.after(), Out());
+}
+
+void RunHelp(Session&, const Args& args) {
+  if (args.Has("COMMAND")) {
+    PrintCommandHelp(args.Text("COMMAND"), Out());
+  } else {
+    PrintCommandList(Out());
+  }
+}
+
+void NoOptions(po::options_description&) {}
+
+std::vector<Command> MakeCommands() {
+  const bool kAction = true, kView = false;
+  const Command::Parsing kParsed = Command::kOptions, kRaw = Command::kWords,
+                        kText = Command::kText;
+  return {
+      // ---- The device.
+      {"sample-device", "", "add the demo's sample phone: 33 games and more",
+       "Adds the sample device's packages (a few dozen games, other applications, a\n"
+       "no-display service, a deactivated package), a 720x1280 screen, no card.",
+       "sample-device", kAction, kParsed, NoOptions, RunSampleDevice},
+      {"game", "APPID LABEL", "add a game package to the device (no event)",
+       "Installs, silently, a package APPID holding one game APPID labelled LABEL.\n"
+       "Options change its properties.",
+       "game com.acme.tetra \"Tetra Blocks\" --preload", kAction, kParsed, AddBothOptions,
+       RunGame},
+      {"package", "PKGID", "add or change a package (no event)",
+       "Adds package PKGID, or changes the one described already. With --held it\n"
+       "stays off the device until `install PKGID` or `update PKGID` sends it.",
+       "package com.acme.pack --held\napp com.acme.pack com.acme.one --label One --game\n"
+       "install com.acme.pack",
+       kAction, kParsed,
+       [](po::options_description& o) {
+         AddPackageOptions(o);
+         o.add_options()("held", po::bool_switch(), "describe it, install it later");
+       },
+       RunPackage},
+      {"app", "PKGID APPID", "add or change an application of a package (no event)",
+       "Adds application APPID to package PKGID (made if missing), or changes it. A\n"
+       "new application is a plain one labelled APPID; --game makes it a game.",
+       "app com.acme.tetra com.acme.tetra --label \"Tetra 2\" --no-display", kAction, kParsed,
+       AddAppOptions, RunApp},
+      {"remove", "PKGID", "remove a package (no event)",
+       "Removes package PKGID from the device, or forgets a held one, silently.",
+       "remove com.acme.tetra", kAction, kParsed, NoOptions, RunRemove},
+      {"preference", "KEY [VALUE]", "set an integer preference, or remove it",
+       "Sets preference KEY to the integer VALUE; without VALUE removes it.",
+       "preference memory/sysman/mmc 1", kAction, kParsed, NoOptions, RunPreference},
+      {"card", "in|out", "insert or pull the storage card",
+       "Sets the storage-card status (preference memory/sysman/mmc): 1 in, 0 out.",
+       "card out", kAction, kParsed, NoOptions,
+       RunCard},
+      {"screen", "WIDTH HEIGHT", "set the screen size",
+       "Sets the platform's screen.width and screen.height features.", "screen 720 1280",
+       kAction, kParsed, NoOptions, RunScreen},
+      {"mdm", "reachable|unreachable [APPID=STATE...]", "set the policy service",
+       "Makes the device-management service reachable or not, and gives applications\n"
+       "a state: allowed, restricted, error or a number. Unnamed ones are allowed.",
+       "mdm reachable com.acme.tetra=restricted", kAction, kParsed, NoOptions, RunMdm},
+      {"fail", "CALL [ERROR] [once|always]", "make a platform call fail; `fail clear`",
+       "Makes platform call CALL (by its C name) return ERROR, an integer such as -22\n"
+       "(invalid parameter): the next time (once, after --skip N others) or always.\n"
+       "`fail clear` lifts every failure.",
+       "fail app_info_get_label -22 once", kAction, kParsed,
+       [](po::options_description& o) {
+         o.add_options()("skip", po::value<int>()->default_value(0)->value_name("N"),
+                         "let N calls pass first");
+       },
+       RunFail},
+      {"before", "CALL COMMAND...", "run a command when the engine next makes CALL",
+       "When the engine next makes platform call CALL, COMMAND runs first, in the\n"
+       "middle of whatever the engine is doing: a package that completes while the\n"
+       "launcher starts, say.",
+       "before app_info_filter_create install com.acme.late \"Late Game\"\nstart", kAction,
+       kText, NoOptions, RunBefore},
+      // ---- Events.
+      {"install", "PKGID [LABEL]", "install a package, with its events",
+       "Installs a package PKGID holding one game PKGID labelled LABEL (options change\n"
+       "it), or the held package PKGID, sending STARTED, PROCESSING and COMPLETED.",
+       "install com.acme.tetra \"Tetra Blocks\"", kAction, kParsed, AddBothOptions,
+       RunInstall},
+      {"update", "PKGID [LABEL]", "update a package, with its events",
+       "Updates installed package PKGID, changing its application APPID (--app; by\n"
+       "default the one named PKGID, else the first) by LABEL and the options, or sends\n"
+       "the held package PKGID as the update.",
+       "update com.acme.tetra \"Tetra Blocks 2\"\nupdate com.acme.tetra --enabled=false",
+       kAction, kParsed,
+       [](po::options_description& o) {
+         AddBothOptions(o);
+         o.add_options()("app", po::value<std::string>()->value_name("APPID"),
+                         "the application to change (added if new)");
+       },
+       RunUpdate},
+      {"uninstall", "PKGID", "uninstall a package, with its events",
+       "Uninstalls package PKGID: STARTED while its applications can still be read,\n"
+       "PROCESSING, then the package goes, then COMPLETED.",
+       "uninstall com.acme.tetra", kAction, kParsed, NoOptions, RunUninstall},
+      {"event", "EVENT STATE PKGID", "send one raw package event",
+       "Sends one package event whatever the device holds. EVENT: install, uninstall,\n"
+       "update or any integer; STATE: started, processing, completed, failed or any\n"
+       "integer.",
+       "event install started com.acme.ghost\nevent 7 -100 com.acme.ghost", kAction, kParsed,
+       [](po::options_description& o) {
+         o.add_options()("pkg-type", po::value<std::string>()->default_value("tpk"),
+                         "package type")(
+             "progress", po::value<int>()->default_value(0)->value_name("N"), "progress")(
+             "error", po::value<int>()->default_value(0)->value_name("N"), "error code");
+       },
+       RunEvent},
+      {"boot-done", "", "send the BootingDone signal on the system bus",
+       "Sends deviced's BootingDone signal and says how many handlers it reached.",
+       "boot-done", kAction, kParsed, NoOptions, RunBootDone},
+      // ---- The engine.
+      {"start", "", "start the engine: data_engin_initialization()",
+       "Calls data_engin_initialization() as the launcher does at start-up: the first\n"
+       "launch lays every game out in menu 1 \"Apps\".",
+       "start", kAction, kParsed, NoOptions, RunStart},
+      {"stop", "", "data_engin_uninitialization()",
+       "Calls data_engin_uninitialization(), which does nothing: the managers live\n"
+       "until the process ends.",
+       "stop", kAction, kParsed, NoOptions, RunStop},
+      {"call", "NAME [ARG...]", "call an operation of the engine's managers",
+       "Calls any public operation of LauncherDataManager, LauncherPackageManager,\n"
+       "LogClientManager or SystemInfo and prints its result (first line), then its\n"
+       "out-parameters and records, one per line. `call --list` lists them all.",
+       "call GetMenuData 1\ncall GetBoxIdByAppId com.acme.tetra", kAction, kRaw, NoOptions,
+       RunCall},
+      {"on-card", "APPID...", "mark applications as living on the storage card",
+       "Marks the cached information of each application as on the storage card, as\n"
+       "the launcher application does (reading it into the cache first if needed).",
+       "on-card com.acme.tetra", kAction, kParsed, NoOptions, RunOnCard},
+      // ---- Views.
+      {"layout", "[MENUID]", "show a menu's stored layout",
+       "Shows menu MENUID (1) page by page as 4-column grids, each folder's pages\n"
+       "(3 by 3) under the page holding it. [Name] is a folder, <Name> a shortcut.",
+       "layout", kView, kParsed,
+       [](po::options_description& o) {
+         o.add_options()("ids", po::bool_switch(), "show box and page ids");
+       },
+       RunLayout},
+      {"folder", "BOXID", "show one folder's pages",
+       "Shows the pages of folder box BOXID as 3-column grids.", "folder 40 --ids", kView,
+       kParsed,
+       [](po::options_description& o) {
+         o.add_options()("ids", po::bool_switch(), "show box and page ids");
+       },
+       RunFolder},
+      {"downloads", "", "show the download view",
+       "Shows the engine's download view: the boxes not preloaded, on virtual pages.",
+       "downloads", kView, kParsed, NoOptions, RunDownloads},
+      {"alphabetical", "[PARENTID]", "show the alphabetical view",
+       "Shows the engine's alphabetical view of menu PARENTID (1), or with --folder of\n"
+       "folder box PARENTID.",
+       "alphabetical\nalphabetical 40 --folder", kView, kParsed,
+       [](po::options_description& o) {
+         o.add_options()("folder", po::bool_switch(), "PARENTID is a folder box");
+       },
+       RunAlphabetical},
+      {"log", "", "show the platform log",
+       "Shows the log lines the last command that changed something wrote (--all:\n"
+       "every line), as P/tag: text.",
+       "log --priority E --grep \"Do not add\"", kView, kParsed,
+       [](po::options_description& o) {
+         o.add_options()("priority", po::value<std::string>()->value_name("V|D|I|W|E|F"),
+                         "this priority and above")(
+             "grep", po::value<std::string>()->value_name("TEXT"), "lines holding TEXT")(
+             "all", po::bool_switch(), "every line since the start")(
+             "message", po::bool_switch(), "leave out the file, function and line");
+       },
+       RunLog},
+      {"tables", "[TABLE...]", "show the raw tables",
+       "Shows every row of the layout database's tables (Menus, Pages, Boxes).",
+       "tables Menus Pages", kView, kParsed, NoOptions, RunTables},
+      {"changes", "", "show what the last command did to the database",
+       "Shows the rows the last command that changed something added (+), removed (-)\n"
+       "and changed (~, column by column).",
+       "uninstall com.acme.tetra\nchanges", kView, kParsed, NoOptions, RunChanges},
+      {"expect", "", "check what the previous command printed",
+       "The lines that follow, up to a blank line or `end`, must equal what the\n"
+       "previous command printed. Runs of blanks count as one; trailing blanks do not\n"
+       "count. A difference stops the script with a diff.",
+       "layout\nexpect\nmenu 1 \"Apps\"\npage 1\n 1 | Tetra Blocks\nend", kView, kParsed,
+       NoOptions, [](Session&, const Args&) {}},
+      {"say", "TEXT...", "print a sentence", "Prints its words: narration for stories.",
+       "say Now the card comes out.", kView, kText, NoOptions, RunSay},
+      {"help", "[COMMAND]", "list the commands, or describe one",
+       "Lists the commands, or describes COMMAND with its options and an example.",
+       "help install", kView, kParsed, NoOptions, RunHelp},
+  };
+}
+
+}  // namespace
+
+bool Args::Has(const std::string& name) const { return values_.count(name) > 0; }
+
+std::string Args::Text(const std::string& name) const {
+  return Has(name) ? values_[name].as<std::string>() : std::string();
+}
+
+std::vector<std::string> Args::List(const std::string& name) const {
+  return Has(name) ? values_[name].as<std::vector<std::string> >()
+                   : std::vector<std::string>();
+}
+
+const std::vector<Command>& Commands() {
+  static const std::vector<Command> commands = MakeCommands();
+  return commands;
+}
+
+const Command* FindCommand(const std::string& name) {
+  for (const Command& command : Commands()) {
+    if (command.name == name) return &command;
+  }
+  return NULL;
+}
+
+}  // namespace korrin_sim

@@ -1,0 +1,299 @@
+#include "session.h"
+
+#include <algorithm>
+#include <iostream>
+#include <sstream>
+
+#include <boost/program_options.hpp>
+#include <dtl/dtl.hpp>
+
+#include "calls.h"
+#include "cli.h"
+#include "commands.h"
+#include "common/device-path.h"
+
+namespace po = boost::program_options;
+
+namespace korrin_sim {
+
+namespace {
+
+// A positional argument of a synopsis such as "PKGID [LABEL]" or "[APPID...]".
+struct Positional {
+  std::string name;
+  bool optional;
+  bool repeated;
+};
+
+std::vector<Positional> Positionals(const std::string& synopsis) {
+  std::vector<Positional> positionals;
+  std::istringstream words(synopsis);
+  std::string word;
+  while (words >> word) {
+    Positional p{word, false, false};
+    if (p.name.front() == '[') {
+      p.optional = true;
+      p.name = p.name.substr(1, p.name.size() - 2);
+    }
+    if (p.name.size() > 3 && p.name.compare(p.name.size() - 3, 3, "...") == 0) {
+      p.repeated = true;
+      p.name.resize(p.name.size() - 3);
+    }
+    positionals.push_back(p);
+  }
+  return positionals;
+}
+
+// "--game false" would set --game and hand "false" to a positional argument:
+// refuse it, since the value was meant for the option.
+void RefuseSpacedFlagValue(const Command& command, const po::options_description& options,
+                           const std::vector<std::string>& words) {
+  static const std::vector<std::string> kBoolWords = {"true", "false", "yes", "no",
+                                                      "on",   "off",   "1",   "0"};
+  for (size_t i = 0; i + 1 < words.size(); ++i) {
+    const std::string& word = words[i];
+    if (word.compare(0, 2, "--") != 0 || word.find('=') != std::string::npos) continue;
+    const po::option_description* option = options.find_nothrow(word.substr(2), false);
+    if (option == NULL || !dynamic_cast<const po::typed_value<bool>*>(option->semantic().get()) ||
+        std::find(kBoolWords.begin(), kBoolWords.end(), words[i + 1]) == kBoolWords.end()) {
+      continue;
+    }
+    throw UsageError(command.name + ": write " + word + "=" + words[i + 1] + ", not " + word +
+                     " " + words[i + 1]);
+  }
+}
+
+po::options_description VisibleOptions(const Command& command) {
+  po::options_description options("options", 80, 40);
+  command.options(options);
+  return options;
+}
+
+// Parses |words| as |command|'s arguments into |values|; throws UsageError.
+void Parse(const Command& command, const std::vector<std::string>& words,
+           po::variables_map& values) {
+  po::options_description all = VisibleOptions(command);
+  po::positional_options_description order;
+  std::vector<Positional> positionals = Positionals(command.args);
+  for (const Positional& p : positionals) {
+    if (p.repeated) {
+      all.add_options()(p.name.c_str(), po::value<std::vector<std::string> >());
+    } else {
+      all.add_options()(p.name.c_str(), po::value<std::string>());
+    }
+    order.add(p.name.c_str(), p.repeated ? -1 : 1);
+  }
+  // Long options only, never abbreviated: "-5" is a number, "--lab" a mistake.
+  int style = po::command_line_style::unix_style & ~po::command_line_style::allow_short &
+              ~po::command_line_style::allow_guessing;
+  RefuseSpacedFlagValue(command, all, words);
+  try {
+    po::store(po::command_line_parser(words).options(all).positional(order).style(style).run(),
+              values);
+    po::notify(values);
+  } catch (const po::error& e) {
+    throw UsageError(command.name + ": " + e.what());
+  }
+  for (const Positional& p : positionals) {
+    if (!p.optional && values.count(p.name) == 0) {
+      throw UsageError(command.name + ": missing " + p.name + " (usage: " + command.name +
+                       " " + command.args + ")");
+    }
+  }
+}
+
+std::vector<std::string> SplitWords(const std::string& line) {
+  try {
+    return po::split_unix(line);
+  } catch (const std::exception& e) {
+    throw UsageError(std::string("cannot split the line into words: ") + e.what());
+  }
+}
+
+// A line as `expect` compares it: runs of blanks as one, no trailing blanks.
+std::string Normalized(const std::string& line) {
+  std::string out;
+  for (char c : line) {
+    bool blank = c == ' ' || c == '\t';
+    if (blank && (out.empty() || out.back() == ' ')) {
+      if (out.empty()) out += ' ';
+      continue;
+    }
+    out += blank ? ' ' : c;
+  }
+  if (out == " ") out.clear();
+  while (!out.empty() && out.back() == ' ') out.pop_back();
+  return out;
+}
+
+std::vector<std::string> NormalizedLines(const std::string& text) {
+  std::vector<std::string> lines;
+  std::istringstream in(text);
+  std::string line;
+  while (std::getline(in, line)) lines.push_back(Normalized(line));
+  while (!lines.empty() && lines.back().empty()) lines.pop_back();
+  return lines;
+}
+
+// |line| after its first word, without the blanks around it.
+std::string RestOfLine(const std::string& line) {
+  size_t start = line.find_first_not_of(" \t");
+  start = line.find_first_of(" \t", start);
+  start = line.find_first_not_of(" \t", start);
+  if (start == std::string::npos) return "";
+  return line.substr(start, line.find_last_not_of(" \t") + 1 - start);
+}
+
+bool IsBlank(const std::string& line) { return Normalized(line).empty(); }
+
+bool IsComment(const std::string& line) {
+  size_t first = line.find_first_not_of(" \t");
+  return first != std::string::npos && line[first] == '#';
+}
+
+}  // namespace
+
+Session::Session(bool printActions) : printActions_(printActions), logMark_(0) {}
+
+std::string Session::DatabasePath() const { return korrin::DevicePath(korrin::kGameDataDbPath); }
+
+Session::Prepared Session::Prepare(const std::string& line) const {
+  Prepared prepared;
+  std::string name = line.substr(line.find_first_not_of(" \t"));
+  name = name.substr(0, name.find_first_of(" \t"));
+  prepared.command = FindCommand(name);
+  if (prepared.command == NULL) {
+    throw UsageError("unknown command '" + name + "' (`help` lists the commands)");
+  }
+  prepared.rest = RestOfLine(line);
+  if (prepared.command->parsing != Command::kText) prepared.words = SplitWords(prepared.rest);
+  if (prepared.command->parsing == Command::kOptions) {
+    Parse(*prepared.command, prepared.words, prepared.values);
+  }
+  return prepared;
+}
+
+void Session::Execute(const std::string& line) {
+  if (IsBlank(line) || IsComment(line)) return;
+  Prepared prepared = Prepare(line);
+  const Command& command = *prepared.command;
+
+  Snapshot before;
+  size_t logMark = sim::Device::Get().Logs().size();
+  if (command.action) before = TakeSnapshot(DatabasePath());
+  // A command may run inside another (see `before`): print where it prints.
+  std::ostream& outer = Out();
+  std::ostringstream output;
+  SetOut(&output);
+  try {
+    command.run(*this, Args(prepared.values, prepared.words, prepared.rest));
+  } catch (...) {
+    SetOut(&outer);
+    throw;
+  }
+  SetOut(&outer);
+  lastOutput_ = output.str();
+  if (command.action) {
+    before_ = before;
+    after_ = TakeSnapshot(DatabasePath());
+    logMark_ = logMark;
+  }
+  if (&outer != &std::cout) {
+    outer << lastOutput_;
+  } else if (printActions_ || !command.action) {
+    std::cout << lastOutput_ << std::flush;
+  }
+}
+
+void Session::Expect(const std::vector<std::string>& expectedLines) const {
+  std::vector<std::string> expected;
+  for (const std::string& line : expectedLines) expected.push_back(Normalized(line));
+  while (!expected.empty() && expected.back().empty()) expected.pop_back();
+  std::vector<std::string> printed = NormalizedLines(lastOutput_);
+  if (expected == printed) return;
+  dtl::Diff<std::string> diff(expected, printed);
+  diff.compose();
+  std::ostringstream message;
+  message << "expect: the previous command printed something else (-expected +printed):";
+  for (const std::pair<std::string, dtl::elemInfo>& step : diff.getSes().getSequence()) {
+    char mark = step.second.type == dtl::SES_DELETE ? '-'
+                : step.second.type == dtl::SES_ADD  ? '+'
+                                                    : ' ';
+    message << "\n" << mark << step.first;
+  }
+  throw UsageError(message.str());
+}
+
+bool Session::RunScript(std::istream& in, const std::string& file, std::ostream& errors) {
+  std::string line;
+  int number = 0;
+  while (std::getline(in, line)) {
+    ++number;
+    int at = number;
+    try {
+      if (Normalized(line) == "expect") {
+        std::vector<std::string> block;
+        while (std::getline(in, line)) {
+          ++number;
+          if (IsBlank(line) || Normalized(line) == "end") break;
+          block.push_back(line);
+        }
+        Expect(block);
+      } else {
+        Execute(line);
+      }
+    } catch (const std::exception& e) {
+      std::cout << std::flush;
+      errors << file << ":" << at << ": " << e.what() << std::endl;
+      return false;
+    }
+  }
+  return true;
+}
+
+void PrintCommandList(std::ostream& out) {
+  out << "usage: korrin-sim [demo] [--root DIR]\n"
+         "       korrin-sim run [--root DIR] FILE...\n"
+         "       korrin-sim shell [--root DIR]\n"
+         "       korrin-sim help [COMMAND]\n\n"
+         "Without --root, the device lives in a fresh temporary folder.\n"
+         "Scripts hold one command per line; # starts a comment line.\n\n"
+         "commands:\n";
+  for (const Command& command : Commands()) {
+    std::string synopsis = command.name + (command.args.empty() ? "" : " " + command.args);
+    out << "  " << synopsis << std::string(synopsis.size() < 30 ? 30 - synopsis.size() : 1, ' ')
+        << command.summary << "\n";
+  }
+  out << "\n`korrin-sim help COMMAND` describes one, with its options.\n\n"
+         "a first script:\n"
+         "  install com.acme.tetra \"Tetra Blocks\"   # needs no `start`: first launch\n"
+         "  start                                  # lays out what is installed\n"
+         "  install com.acme.zeppelin \"Zeppelin\"\n"
+         "  uninstall com.acme.tetra\n"
+         "  layout\n"
+         "  expect\n"
+         "  menu 1 \"Apps\"\n"
+         "  page 1\n"
+         "   1 | Zeppelin\n"
+         "  end\n";
+}
+
+void PrintCommandHelp(const std::string& name, std::ostream& out) {
+  const Command* command = FindCommand(name);
+  if (command == NULL) throw UsageError("no command '" + name + "' (`help` lists them)");
+  out << "usage: " << command->name << (command->args.empty() ? "" : " " + command->args)
+      << (command->options ? "" : "") << "\n\n"
+      << command->details << "\n";
+  po::options_description options = VisibleOptions(*command);
+  if (!options.options().empty()) out << "\n" << options;
+  if (command->name == "call") {
+    out << "\noperations:\n";
+    ListCalls(out);
+  }
+  out << "\nexample:\n";
+  std::istringstream example(command->example);
+  std::string line;
+  while (std::getline(example, line)) out << "  " << line << "\n";
+}
+
+}  // namespace korrin_sim

@@ -1,0 +1,77 @@
+// A korrin-sim session: the commands of scripts and of the shell, run one at
+// a time against the one simulated device and the engine in this process.
+#ifndef KORRIN_SIM_SESSION_H_
+#define KORRIN_SIM_SESSION_H_
+
+#include <stddef.h>
+
+#include <istream>
+#include <map>
+#include <ostream>
+#include <string>
+#include <vector>
+
+#include <boost/program_options/variables_map.hpp>
+
+#include "commands.h"
+#include "sim/device.h"
+#include "views.h"
+
+namespace korrin_sim {
+
+class Session {
+ public:
+  // |printActions| false keeps what commands that change something print to
+  // themselves (for `expect`), so that only views and `say` reach the screen.
+  explicit Session(bool printActions = true);
+
+  // Runs one command line (comments and blank lines do nothing). Throws
+  // UsageError, having changed nothing, when it cannot run as written.
+  void Execute(const std::string& line);
+  // Checks that |line| (not blank) would run, changing nothing.
+  void Check(const std::string& line) const { Prepare(line); }
+  // Compares the lines of an `expect` block with what the last command
+  // printed; throws UsageError with a diff when they differ.
+  void Expect(const std::vector<std::string>& lines) const;
+
+  // Plays a script to its end, or to its first error, which it reports as
+  // "FILE:LINE: message" on |errors|. True when every line ran.
+  bool RunScript(std::istream& in, const std::string& file, std::ostream& errors);
+
+  // ---- For the commands.
+
+  // The layout database on this machine.
+  std::string DatabasePath() const;
+  // Packages described with `package --held`: not on the device until an
+  // install or update sends them.
+  std::map<std::string, sim::Package>& held() { return held_; }
+  // The log lines the last command that changed something wrote.
+  size_t logMark() const { return logMark_; }
+  const Snapshot& before() const { return before_; }
+  const Snapshot& after() const { return after_; }
+
+ private:
+  struct Prepared {
+    const Command* command;
+    std::string rest;                // the line after the command's name
+    std::vector<std::string> words;  // |rest| as words
+    boost::program_options::variables_map values;
+  };
+  Prepared Prepare(const std::string& line) const;
+
+  bool printActions_;
+  std::string lastOutput_;  // what the last command printed
+  size_t logMark_;          // first log line of the last action
+  Snapshot before_;         // the database around the last action
+  Snapshot after_;
+  std::map<std::string, sim::Package> held_;
+};
+
+// `korrin-sim --help`: every command, one line each, and a first script.
+void PrintCommandList(std::ostream& out);
+// `help COMMAND`: what it does, its options and an example.
+void PrintCommandHelp(const std::string& name, std::ostream& out);
+
+}  // namespace korrin_sim
+
+#endif  // KORRIN_SIM_SESSION_H_

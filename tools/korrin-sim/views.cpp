@@ -1,0 +1,323 @@
+#include "views.h"
+
+#include <sqlite3.h>
+#include <stdlib.h>
+
+#include <algorithm>
+#include <set>
+
+#include "cli.h"
+#include "sim/device.h"
+
+namespace korrin_sim {
+
+namespace {
+
+const size_t kCellWidth = 16;
+const int kMenuColumns = 4;
+const int kFolderColumns = 3;
+
+// One value as SQLite gave it.
+struct Value {
+  int type;  // SQLITE_INTEGER, SQLITE_TEXT, ...
+  std::string text;
+
+  int Int() const { return atoi(text.c_str()); }
+  // As the raw views print it.
+  std::string Show() const {
+    if (type == SQLITE_NULL) return "NULL";
+    if (type == SQLITE_TEXT) return Quote(text);
+    if (type != SQLITE_BLOB) return text;
+    static const char kHex[] = "0123456789abcdef";
+    std::string hex = "x'";
+    for (unsigned char c : text) hex += std::string(1, kHex[c >> 4]) + kHex[c & 15];
+    return hex + "'";
+  }
+};
+typedef std::vector<Value> Row;
+
+// A read-only connection to the layout database; invalid when the file
+// cannot be opened (not made yet, say).
+class Reader {
+ public:
+  explicit Reader(const std::string& path) : db_(NULL) {
+    if (sqlite3_open_v2(path.c_str(), &db_, SQLITE_OPEN_READONLY, NULL) != SQLITE_OK) {
+      sqlite3_close(db_);
+      db_ = NULL;
+    }
+  }
+  ~Reader() { sqlite3_close(db_); }
+  bool ok() const { return db_ != NULL; }
+
+  // The rows of |sql|, with |param| bound to its one parameter if it has one.
+  // Empty when the statement fails (a table that is missing, say).
+  std::vector<Row> Rows(const std::string& sql, int64_t param = 0) const {
+    std::vector<Row> rows;
+    sqlite3_stmt* stmt = NULL;
+    if (db_ == NULL || sqlite3_prepare_v2(db_, sql.c_str(), -1, &stmt, NULL) != SQLITE_OK) {
+      return rows;
+    }
+    if (sqlite3_bind_parameter_count(stmt) > 0) sqlite3_bind_int64(stmt, 1, param);
+    while (sqlite3_step(stmt) == SQLITE_ROW) {
+      Row row;
+      for (int i = 0; i < sqlite3_column_count(stmt); ++i) {
+        const char* text = static_cast<const char*>(sqlite3_column_blob(stmt, i));
+        row.push_back(Value{sqlite3_column_type(stmt, i),
+                            std::string(text != NULL ? text : "",
+                                        static_cast<size_t>(sqlite3_column_bytes(stmt, i)))});
+      }
+      rows.push_back(row);
+    }
+    sqlite3_finalize(stmt);
+    return rows;
+  }
+
+  std::vector<std::string> Columns(const std::string& table) const {
+    std::vector<std::string> names;
+    for (const Row& row : Rows("PRAGMA table_info(" + Quote(table) + ")")) {
+      names.push_back(row[1].text);
+    }
+    return names;
+  }
+
+  // The tables the engine made, in the order it made them.
+  std::vector<std::string> Tables() const {
+    std::vector<std::string> names;
+    for (const Row& row : Rows("SELECT name FROM sqlite_master WHERE type = 'table' AND "
+                               "name NOT LIKE 'sqlite_%' ORDER BY rowid")) {
+      names.push_back(row[0].text);
+    }
+    return names;
+  }
+
+ private:
+  sqlite3* db_;
+};
+
+// |text| cut or padded to |width| characters, counting UTF-8 sequences as one.
+std::string Cell(const std::string& text, size_t width) {
+  std::vector<size_t> starts;
+  for (size_t i = 0; i < text.size(); ++i) {
+    if ((static_cast<unsigned char>(text[i]) & 0xC0) != 0x80) starts.push_back(i);
+  }
+  if (starts.size() > width) return text.substr(0, starts[width - 1]) + "~";
+  return text + std::string(width - starts.size(), ' ');
+}
+
+std::string TrimRight(std::string line) {
+  line.erase(line.find_last_not_of(' ') + 1);
+  return line;
+}
+
+// The boxes of one stored page, drawn as a grid, then the pages of each folder
+// on it, indented under it.
+void PrintStoredPage(const Reader& db, int64_t pageId, int columns, int indent, bool ids,
+                     std::ostream& out);
+
+void PrintFolderPages(const Reader& db, int64_t boxId, const std::string& name, int indent,
+                      bool ids, std::ostream& out) {
+  std::vector<Row> pages = db.Rows(
+      "SELECT pageId, pageNo FROM Pages WHERE isFolder = 1 AND parentId = ? ORDER BY pageNo",
+      boxId);
+  std::string pad(indent, ' ');
+  if (pages.empty()) out << pad << "folder " << Quote(name) << ": no pages\n";
+  for (const Row& page : pages) {
+    out << pad << "folder " << Quote(name) << ", page " << page[1].text;
+    if (ids) out << " (pageId " << page[0].text << ")";
+    out << "\n";
+    PrintStoredPage(db, page[0].Int(), kFolderColumns, indent, ids, out);
+  }
+}
+
+void PrintStoredPage(const Reader& db, int64_t pageId, int columns, int indent, bool ids,
+                     std::ostream& out) {
+  std::vector<Row> boxes = db.Rows(
+      "SELECT boxId, isFolder, boxType, appId, name, col, row FROM Boxes WHERE pageId = ? "
+      "ORDER BY row, col, boxId",
+      pageId);
+  std::vector<GridBox> grid;
+  for (const Row& box : boxes) {
+    std::string label = BoxLabel(box[1].Int() != 0, box[2].Int(), box[3].text, box[4].text);
+    if (ids) label = "#" + box[0].text + " " + label;
+    grid.push_back(GridBox{box[5].Int(), box[6].Int(), label});
+  }
+  PrintGrid(grid, columns, indent, out);
+  for (const Row& box : boxes) {
+    if (box[1].Int() != 0) PrintFolderPages(db, box[0].Int(), box[4].text, indent + 4, ids, out);
+  }
+}
+
+const char kNoDatabase[] = "no layout database yet: `start` makes it\n";
+
+}  // namespace
+
+std::string BoxLabel(bool isFolder, int boxType, const std::string& appId,
+                     const std::string& name) {
+  if (isFolder) return "[" + name + "]";
+  if (boxType == 3) return "<" + name + ">";
+  if (!name.empty()) return name;
+  const sim::App* app = sim::Device::Get().FindApp(appId);
+  return app != NULL && app->label && !app->label->empty() ? *app->label : appId;
+}
+
+void PrintGrid(const std::vector<GridBox>& boxes, int columns, int indent, std::ostream& out) {
+  std::string pad(indent, ' ');
+  if (boxes.empty()) {
+    out << pad << " (empty)\n";
+    return;
+  }
+  int rows = 0;
+  std::map<std::pair<int, int>, std::string> cells;  // (row, col) -> label
+  std::vector<const GridBox*> elsewhere;
+  for (const GridBox& box : boxes) {
+    bool onGrid = box.row >= 1 && box.col >= 1 && box.col <= columns;
+    if (onGrid && cells.emplace(std::make_pair(box.row, box.col), box.label).second) {
+      rows = std::max(rows, box.row);
+    } else {
+      elsewhere.push_back(&box);
+    }
+  }
+  for (int row = 1; row <= rows; ++row) {
+    std::string line = pad + (row < 10 ? " " : "") + std::to_string(row) + " ";
+    int last = 0;
+    for (int col = 1; col <= columns; ++col) {
+      if (cells.count(std::make_pair(row, col))) last = col;
+    }
+    for (int col = 1; col <= last; ++col) {
+      std::map<std::pair<int, int>, std::string>::const_iterator cell =
+          cells.find(std::make_pair(row, col));
+      line += "| " + Cell(cell != cells.end() ? cell->second : "", kCellWidth) + " ";
+    }
+    out << TrimRight(line) << "\n";
+  }
+  for (const GridBox* box : elsewhere) {
+    out << pad << "   also at row " << box->row << ", col " << box->col << ": " << box->label
+        << "\n";
+  }
+}
+
+void PrintMenuLayout(const std::string& dbPath, int menuId, bool ids, std::ostream& out) {
+  Reader db(dbPath);
+  if (!db.ok()) {
+    out << kNoDatabase;
+    return;
+  }
+  std::vector<Row> menu = db.Rows("SELECT name FROM Menus WHERE menuId = ?", menuId);
+  if (menu.empty()) {
+    out << "no menu " << menuId << "\n";
+    return;
+  }
+  out << "menu " << menuId << " " << menu[0][0].Show() << "\n";
+  std::vector<Row> pages = db.Rows(
+      "SELECT pageId, pageNo FROM Pages WHERE isFolder = 0 AND parentId = ? ORDER BY pageNo",
+      menuId);
+  if (pages.empty()) out << " (no pages)\n";
+  for (const Row& page : pages) {
+    out << "page " << page[1].text;
+    if (ids) out << " (pageId " << page[0].text << ")";
+    out << "\n";
+    PrintStoredPage(db, page[0].Int(), kMenuColumns, 0, ids, out);
+  }
+}
+
+void PrintFolder(const std::string& dbPath, int boxId, bool ids, std::ostream& out) {
+  Reader db(dbPath);
+  if (!db.ok()) {
+    out << kNoDatabase;
+    return;
+  }
+  std::vector<Row> box = db.Rows("SELECT name FROM Boxes WHERE boxId = ? AND isFolder", boxId);
+  if (box.empty()) {
+    out << "no folder box " << boxId << "\n";
+    return;
+  }
+  PrintFolderPages(db, boxId, box[0][0].text, 0, ids, out);
+}
+
+void PrintTables(const std::string& dbPath, const std::vector<std::string>& tables,
+                 std::ostream& out) {
+  Reader db(dbPath);
+  if (!db.ok()) {
+    out << kNoDatabase;
+    return;
+  }
+  std::vector<std::string> known = db.Tables();
+  for (const std::string& table : tables) {
+    if (std::find(known.begin(), known.end(), table) == known.end()) {
+      throw UsageError("no table '" + table + "' (there are Menus, Pages and Boxes)");
+    }
+  }
+  for (const std::string& table : tables.empty() ? known : tables) {
+    std::vector<std::string> columns = db.Columns(table);
+    std::vector<Row> rows = db.Rows("SELECT * FROM " + Quote(table) + " ORDER BY rowid");
+    out << table << ": " << rows.size() << (rows.size() == 1 ? " row\n" : " rows\n");
+    for (const Row& row : rows) {
+      std::string line;
+      for (size_t i = 0; i < row.size() && i < columns.size(); ++i) {
+        line += (i ? " " : "  ") + columns[i] + "=" + row[i].Show();
+      }
+      out << line << "\n";
+    }
+  }
+}
+
+Snapshot TakeSnapshot(const std::string& dbPath) {
+  Snapshot snapshot;
+  Reader db(dbPath);
+  for (const std::string& name : db.Tables()) {
+    Snapshot::Table& table = snapshot.tables[name];
+    table.columns = db.Columns(name);
+    for (const Row& row : db.Rows("SELECT rowid, * FROM " + Quote(name))) {
+      std::vector<std::string>& values = table.rows[atoll(row[0].text.c_str())];
+      for (size_t i = 1; i < row.size(); ++i) values.push_back(row[i].Show());
+    }
+  }
+  return snapshot;
+}
+
+void PrintChanges(const Snapshot& before, const Snapshot& after, std::ostream& out) {
+  static const Snapshot::Table kNone;
+  std::set<std::string> names;
+  for (const auto& table : before.tables) names.insert(table.first);
+  for (const auto& table : after.tables) names.insert(table.first);
+  bool any = false;
+  for (const std::string& name : names) {
+    const Snapshot::Table& old = before.tables.count(name) ? before.tables.at(name) : kNone;
+    const Snapshot::Table& now = after.tables.count(name) ? after.tables.at(name) : kNone;
+    const std::vector<std::string>& columns = now.columns.empty() ? old.columns : now.columns;
+    // Every column of a row, or the ones that differ between two.
+    auto describe = [&columns](const std::vector<std::string>& row,
+                               const std::vector<std::string>* was) {
+      std::string text;
+      for (size_t i = 0; i < row.size() && i < columns.size(); ++i) {
+        if (was == NULL) {
+          text += " " + columns[i] + "=" + row[i];
+        } else if (i < was->size() && (*was)[i] != row[i]) {
+          text += " " + columns[i] + ": " + (*was)[i] + " -> " + row[i];
+        }
+      }
+      return text;
+    };
+    std::set<int64_t> ids;
+    for (const auto& row : old.rows) ids.insert(row.first);
+    for (const auto& row : now.rows) ids.insert(row.first);
+    for (int64_t id : ids) {
+      auto was = old.rows.find(id);
+      auto is = now.rows.find(id);
+      std::string line;
+      if (was == old.rows.end()) {
+        line = "+ " + name + describe(is->second, NULL);
+      } else if (is == now.rows.end()) {
+        line = "- " + name + describe(was->second, NULL);
+      } else if (was->second != is->second) {
+        line = "~ " + name + " " + columns[0] + "=" + is->second[0] +
+               describe(is->second, &was->second);
+      }
+      if (!line.empty()) out << line << "\n";
+      any = any || !line.empty();
+    }
+  }
+  if (!any) out << "no changes\n";
+}
+
+}  // namespace korrin_sim

@@ -1,0 +1,59 @@
+// The views of korrin-sim: the layout database drawn as the launcher shows it
+// (pages of 4-column grids, folders 3 by 3), its raw tables, and what a
+// command changed in it. They read the database file through a connection of
+// their own, so looking never changes the engine's state.
+#ifndef KORRIN_SIM_VIEWS_H_
+#define KORRIN_SIM_VIEWS_H_
+
+#include <stdint.h>
+
+#include <map>
+#include <ostream>
+#include <string>
+#include <vector>
+
+namespace korrin_sim {
+
+// One cell of a grid: a box at (col, row), and what it shows.
+struct GridBox {
+  int col;
+  int row;
+  std::string label;
+};
+
+// What a box shows: "[name]" for a folder, "<name>" for a shortcut (box type
+// 3), otherwise its stored name or else the label the device gives appId.
+std::string BoxLabel(bool isFolder, int boxType, const std::string& appId,
+                     const std::string& name);
+
+// Rows of |columns| cells of 16 characters (a longer label ends in "~"), each
+// line indented by |indent|. Boxes outside the grid or on a taken cell are
+// listed under it.
+void PrintGrid(const std::vector<GridBox>& boxes, int columns, int indent, std::ostream& out);
+
+// The stored layout of menu |menuId|: each page as a grid, each folder's pages
+// under the page that holds it. |ids| puts each box's id before its label.
+void PrintMenuLayout(const std::string& dbPath, int menuId, bool ids, std::ostream& out);
+// The pages of the folder box |boxId|.
+void PrintFolder(const std::string& dbPath, int boxId, bool ids, std::ostream& out);
+
+// Every row of the named tables (all tables when |tables| is empty).
+void PrintTables(const std::string& dbPath, const std::vector<std::string>& tables,
+                 std::ostream& out);
+
+// Every row of every table, by table and row id: values as text, NULL as
+// NULL, texts quoted.
+struct Snapshot {
+  struct Table {
+    std::vector<std::string> columns;
+    std::map<int64_t, std::vector<std::string> > rows;
+  };
+  std::map<std::string, Table> tables;
+};
+Snapshot TakeSnapshot(const std::string& dbPath);
+// Rows added (+), removed (-) and changed (~, column by column).
+void PrintChanges(const Snapshot& before, const Snapshot& after, std::ostream& out);
+
+}  // namespace korrin_sim
+
+#endif  // KORRIN_SIM_VIEWS_H_
