@@ -53,15 +53,15 @@ void AddPackageOptions(po::options_description& options) {
   options.add_options()
       ("pkg-type", po::value<std::string>()->value_name("TYPE"),
        "package type events report (tpk)")
-      ("system", po::value<bool>()->implicit_value(true)->value_name("BOOL"),
+      ("system", po::value<bool>()->implicit_value(true, "true")->value_name("BOOL"),
        "a system package")
-      ("removable", po::value<bool>()->implicit_value(true)->value_name("BOOL"),
+      ("removable", po::value<bool>()->implicit_value(true, "true")->value_name("BOOL"),
        "the user may remove it (true)")
-      ("preload", po::value<bool>()->implicit_value(true)->value_name("BOOL"),
+      ("preload", po::value<bool>()->implicit_value(true, "true")->value_name("BOOL"),
        "came with the device")
-      ("support-disable", po::value<bool>()->implicit_value(true)->value_name("BOOL"),
+      ("support-disable", po::value<bool>()->implicit_value(true, "true")->value_name("BOOL"),
        "the user may deactivate it")
-      ("disabled", po::value<bool>()->implicit_value(true)->value_name("BOOL"),
+      ("disabled", po::value<bool>()->implicit_value(true, "true")->value_name("BOOL"),
        "deactivated");
 }
 
@@ -72,12 +72,12 @@ void AddAppOptions(po::options_description& options) {
       ("icon", po::value<std::string>()->value_name("PATH"), "the icon path")
       ("no-icon", po::bool_switch(), "the platform gives no icon path")
       ("type", po::value<std::string>()->value_name("TYPE"), "application type (capp)")
-      ("game", po::value<bool>()->implicit_value(true)->value_name("BOOL"), "a game")
-      ("no-display", po::value<bool>()->implicit_value(true)->value_name("BOOL"),
+      ("game", po::value<bool>()->implicit_value(true, "true")->value_name("BOOL"), "a game")
+      ("no-display", po::value<bool>()->implicit_value(true, "true")->value_name("BOOL"),
        "never shown in menus")
-      ("enabled", po::value<bool>()->implicit_value(true)->value_name("BOOL"),
+      ("enabled", po::value<bool>()->implicit_value(true, "true")->value_name("BOOL"),
        "enabled (true)")
-      ("task-manage", po::value<bool>()->implicit_value(true)->value_name("BOOL"),
+      ("task-manage", po::value<bool>()->implicit_value(true, "true")->value_name("BOOL"),
        "shown in the task manager (true)")
       ("component", po::value<std::string>()->value_name("ui|service|all"),
        "component type (ui)")
@@ -488,7 +488,7 @@ std::vector<Command> MakeCommands() {
          o.add_options()("held", po::bool_switch(), "describe it, install it later");
        },
        RunPackage},
-      {"app", "PKGID APPID", "add or change an application of a package (no event)",
+      {"app", "PKGID APPID", "add or change an application (no event)",
        "Adds application APPID to package PKGID (made if missing), or changes it. A\n"
        "new application is a plain one labelled APPID; --game makes it a game.",
        "app com.acme.tetra com.acme.tetra --label \"Tetra 2\" --no-display", kAction, kParsed,

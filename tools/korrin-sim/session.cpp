@@ -261,13 +261,16 @@ void PrintCommandList(std::ostream& out) {
          "commands:\n";
   for (const Command& command : Commands()) {
     std::string synopsis = command.name + (command.args.empty() ? "" : " " + command.args);
-    out << "  " << synopsis << std::string(synopsis.size() < 30 ? 30 - synopsis.size() : 1, ' ')
+    // A long synopsis gets a line of its own, so that no line passes 80 columns.
+    if (synopsis.size() >= 30) synopsis += "\n" + std::string(32, ' ');
+    out << "  " << synopsis << std::string(synopsis.size() < 30 ? 30 - synopsis.size() : 0, ' ')
         << command.summary << "\n";
   }
   out << "\n`korrin-sim help COMMAND` describes one, with its options.\n\n"
-         "a first script:\n"
-         "  install com.acme.tetra \"Tetra Blocks\"   # needs no `start`: first launch\n"
-         "  start                                  # lays out what is installed\n"
+         "a first script: the launcher starts on an empty phone, two games are\n"
+         "installed and one uninstalled, and the layout is checked:\n"
+         "  start\n"
+         "  install com.acme.tetra \"Tetra Blocks\"\n"
          "  install com.acme.zeppelin \"Zeppelin\"\n"
          "  uninstall com.acme.tetra\n"
          "  layout\n"
