@@ -4,8 +4,9 @@
 // checks that none is left over, and only then calls and prints.
 //
 // Most entries are bound straight to the operation: its parameter types say
-// how each word is read, and records passed by reference are printed after
-// the result. Callbacks, out-parameters and overloads are written by hand.
+// how each word is read, and what it may hand back changed (records and
+// lists taken by reference, boxes it fills) is printed after the result.
+// Callbacks and out-parameters are written by hand.
 #include "calls.h"
 
 #include <app_info.h>
@@ -129,7 +130,8 @@ void SetField(const RecordType<R>& type, const std::string& word, R& record) {
   throw UsageError("'" + name + "' is not a member of " + type.name);
 }
 
-// ---- Enumerations by name, each name standing for its value.
+// ---- Enumerations by name: each name stands for its position, which is its
+// value on the platform (and in the tracker's job types).
 
 const Words kEventTypes = {"install", "uninstall", "update"};
 const Words kEventStates = {"started", "processing", "completed", "failed"};
@@ -149,7 +151,10 @@ class Args {
  public:
   Args(const Words& words, const std::string& syntax) : m_words(words), m_next(1) {
     std::istringstream placeholders(syntax);
-    for (std::string name; placeholders >> name;) m_names.push_back(name);
+    for (std::string name; placeholders >> name;) {
+      if (name.front() == '[') name = name.substr(1, name.size() - 2);
+      m_names.push_back(name);
+    }
   }
 
   bool More() const { return m_next < m_words.size(); }
@@ -195,7 +200,11 @@ class Args {
 
  private:
   const std::string& Next(const char* expected) {
-    if (!More()) throw UsageError("missing " + Name(m_next) + " (" + expected + ")");
+    if (!More()) {
+      std::string name = Name(m_next);
+      if (name != expected) name += std::string(" (") + expected + ")";
+      throw UsageError("missing " + name);
+    }
     return m_words[m_next++];
   }
   template <class T>
@@ -257,7 +266,8 @@ void ShowUserData(std::ostream& out, const Words& ids) { Show(out, ids); }
 
 std::string FormatJob(const Tracker_::PkgData& job) {
   int type = job.type;
-  std::string line = "job type=" + (type >= 0 && type < 4 ? kJobTypes[type] : Value(type)) +
+  bool named = type >= 0 && type < static_cast<int>(kJobTypes.size());
+  std::string line = "job type=" + (named ? kJobTypes[type] : Value(type)) +
                      " reserved=" + Value(job.reserved) + " pkgId=" + Quote(job.pkgId) +
                      " appIds=";
   for (size_t i = 0; i < job.appIds.size(); ++i) {
@@ -347,11 +357,11 @@ void ShowUserData(std::ostream&, TheTracker) {}
 
 // A callback on a handle opened for the one argument (an id), with a fresh U
 // as its user data, printed after the result.
-template <class Handle, bool (*callback)(typename Handle::Type, void*), class U>
+template <class Open, bool (*callback)(typename Open::Type, void*), class U>
 void OnHandle(Args& a, std::ostream& out) {
   std::string id = a.Text();
   a.End();
-  Handle handle(id);
+  Open handle(id);
   if (!handle.Opened(out)) return;
   U data = U();
   Show(out, callback(handle.Get(), Pointer(data)));
@@ -370,10 +380,11 @@ void OnPackageApp(Args& a, std::ostream& out) {
   Show(out, ids);
 }
 
-// A package event as words: TYPE PKG EVENT_TYPE STATE PROGRESS ERROR. Values
-// outside the enums go on as the platform passes them.
-template <class Listen>
-void OnEvent(Args& a, Listen listen) {
+// A package event as words: TYPE PKG EVENT_TYPE STATE PROGRESS ERROR, sent
+// to the platform's callback or |direct|ly to the tracker. Values outside the
+// enums go on as the platform passes them: converted where they are passed,
+// never held in a variable of the enum's type (loading one is undefined).
+void OnEvent(Args& a, bool direct) {
   const char* type = a.CText();
   const char* package = a.CText();
   int eventType = a.Choice(kEventTypes, true);
@@ -381,9 +392,16 @@ void OnEvent(Args& a, Listen listen) {
   int progress = a.Int();
   int error = a.Int();
   a.End();
-  listen(type, package, static_cast<package_manager_event_type_e>(eventType),
-         static_cast<package_manager_event_state_e>(state), progress,
-         static_cast<package_manager_error_e>(error), &Tracker());
+  if (direct) {
+    Tracker().OnClientListenCb(type, package, static_cast<package_manager_event_type_e>(eventType),
+                               static_cast<package_manager_event_state_e>(state), progress,
+                               static_cast<package_manager_error_e>(error), &Tracker());
+  } else {
+    Tracker_::_PkgMgrClientListenCb(
+        type, package, static_cast<package_manager_event_type_e>(eventType),
+        static_cast<package_manager_event_state_e>(state), progress,
+        static_cast<package_manager_error_e>(error), &Tracker());
+  }
 }
 
 // Callbacks for the tracker's Initialize that say when they fire.
@@ -458,10 +476,7 @@ const Operation kOperations[] = {
     STORE(UpdatePageDataForAlphaBeticalOrder, "[PAGE...]", "A fixed false."),
     STORE(DeletePageDataForAlphaBeticalOrder, "PAGEID", "A fixed false."),
     {kStore, "InsertBoxData", "[BOX...]", "Stores the box; prints its new boxId (or -1).",
-     [](Args& a, std::ostream& out) {
-       Invoke(static_cast<int (Store_::*)(GameBoxData&)>(&Store_::InsertBoxData), a, out);
-     },
-     IsRecordForm},
+     Bound<static_cast<int (Store_::*)(GameBoxData&)>(&Store_::InsertBoxData)>, IsRecordForm},
     STORE(UpdateBoxData, "[BOX...]", "Writes box boxId."),
     STORE(DeleteBoxData, "BOXID", "Deletes one box; a folder's pages stay."),
     STORE(GetMenuBoxData, "BOXID", "The box, or a record with boxId 0."),
@@ -532,12 +547,10 @@ const Operation kOperations[] = {
      "A package event as the platform sends it, the tracker as user data. EVENT_TYPE: "
      "install|uninstall|update, STATE: started|processing|completed|failed, either by name "
      "or as an integer; TYPE and PKG may be (null).",
-     [](Args& a, std::ostream&) { OnEvent(a, Tracker_::_PkgMgrClientListenCb); }},
+     [](Args& a, std::ostream&) { OnEvent(a, false); }},
     {kTracker, "OnClientListenCb", "TYPE PKG EVENT_TYPE STATE PROGRESS ERROR",
      "The same event handed to the tracker directly.",
-     [](Args& a, std::ostream&) {
-       OnEvent(a, [](auto... event) { Tracker().OnClientListenCb(event...); });
-     }},
+     [](Args& a, std::ostream&) { OnEvent(a, true); }},
     TRACKER(PauseListenCb, "", "Holds completed package jobs back."),
     TRACKER(StartListenCb, "", "Processes the held jobs and stops holding back."),
     {kTracker, "_DoPkgJob", "TYPE PKGID [APPID...]",
@@ -568,10 +581,7 @@ const Operation kOperations[] = {
     TRACKER(GetAppName, "APPID [BOX...]", "Fills the box from the platform."),
     {kTracker, "_GetAppInfo", "APPID [BOX...]",
      "Reads the application into the box, which becomes its cache entry.",
-     [](Args& a, std::ostream& out) {
-       Invoke(static_cast<bool (Tracker_::*)(std::string, BoxPtr)>(&Tracker_::_GetAppInfo), a,
-              out);
-     },
+     Bound<static_cast<bool (Tracker_::*)(std::string, BoxPtr)>(&Tracker_::_GetAppInfo)>,
      [](const Words& w) { return !FirstIs(w, "--handle"); }},
     {kTracker, "_GetAppInfo", "--handle APPID [BOX...]",
      "The same from a handle opened with app_info_create(APPID).",
@@ -639,9 +649,7 @@ const Operation kOperations[] = {
     SYSTEM(GetCurrentDate, "The day of the month."),
     SYSTEM(IsMdmEnabled, "Whether policy checks are on."),
     {kText, "to_string", "N", "N (an int) in decimal.",
-     [](Args& a, std::ostream& out) {
-       Invoke(static_cast<std::string (*)(int)>(&Korrin3D::to_string), a, out);
-     },
+     Bound<static_cast<std::string (*)(int)>(&Korrin3D::to_string)>,
      [](const Words& w) { return !FirstIs(w, "--unsigned"); }},
     {kText, "to_string", "--unsigned N", "N (0..4294967295) in decimal as a signed number.",
      [](Args& a, std::ostream& out) {

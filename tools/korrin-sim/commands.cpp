@@ -351,10 +351,22 @@ void RunBefore(Session& session, const Args& args) {
   }
   session.Check(line);
   try {
-    Dev().BeforeNext(call, [&session, line]() { session.Execute(line); });
+    Dev().CallCount(call);  // throws for a call the device does not know
   } catch (const std::invalid_argument&) {
     throw UsageError("'" + call + "' is not a platform call the device knows");
   }
+  session.RunBefore(call, line);
+}
+
+void RunCount(Session&, const Args& args) {
+  std::vector<std::string> calls = args.List("CALL");
+  std::vector<int> counts;
+  try {
+    for (const std::string& call : calls) counts.push_back(Dev().CallCount(call));
+  } catch (const std::invalid_argument& e) {
+    throw UsageError(e.what());
+  }
+  for (size_t i = 0; i < calls.size(); ++i) Out() << calls[i] << " " << counts[i] << "\n";
 }
 
 void RunSampleDevice(Session&, const Args&) { Dev().LoadSampleDevice(); }
@@ -422,6 +434,13 @@ std::string Message(const std::string& text) {
   return end == std::string::npos ? text : text.substr(end + 5);
 }
 
+// A log text on one line: a newline in it shows as \n, as it was written.
+std::string OneLine(const std::string& text) {
+  std::string line;
+  for (char c : text) line += c == '\n' ? std::string("\\n") : std::string(1, c);
+  return line;
+}
+
 void RunLog(Session& session, const Args& args) {
   int lowest = 0;
   if (args.Has("priority")) {
@@ -439,8 +458,7 @@ void RunLog(Session& session, const Args& args) {
     if (line.priority < lowest) continue;
     if (args.Has("grep") && line.text.find(args.Text("grep")) == std::string::npos) continue;
     std::string text = args.Get<bool>("message") ? Message(line.text) : line.text;
-    if (!text.empty() && text.back() == '\n') text.pop_back();
-    Out() << PriorityLetter(line.priority) << "/" << line.tag << ": " << text << "\n";
+    Out() << PriorityLetter(line.priority) << "/" << line.tag << ": " << OneLine(text) << "\n";
   }
 }
 
@@ -523,7 +541,8 @@ std::vector<Command> MakeCommands() {
       {"before", "CALL COMMAND...", "run a command when the engine next makes CALL",
        "When the engine next makes platform call CALL, COMMAND runs first, in the\n"
        "middle of whatever the engine is doing: a package that completes while the\n"
-       "launcher starts, say.",
+       "launcher starts, say. Several `before` lines for one call run on its next\n"
+       "calls, one each, in the order written.",
        "before app_info_filter_create install com.acme.late \"Late Game\"\nstart", kAction,
        kText, NoOptions, RunBefore},
       // ---- Events.
@@ -611,7 +630,8 @@ std::vector<Command> MakeCommands() {
        RunAlphabetical},
       {"log", "", "show the platform log",
        "Shows the log lines the last command that changed something wrote (--all:\n"
-       "every line), as P/tag: text.",
+       "every line), as P/tag: text, a newline in a text as \\n. --message leaves out\n"
+       "the \"file: function(line) >  \" prefix.",
        "log --priority E --grep \"Do not add\"", kView, kParsed,
        [](po::options_description& o) {
          o.add_options()("priority", po::value<std::string>()->value_name("V|D|I|W|E|F"),
@@ -621,6 +641,9 @@ std::vector<Command> MakeCommands() {
              "message", po::bool_switch(), "leave out the file, function and line");
        },
        RunLog},
+      {"count", "CALL...", "how often the engine made platform calls",
+       "Prints how many times each platform call was made since the device began.",
+       "count preference_get_int mdm_get_service", kView, kParsed, NoOptions, RunCount},
       {"tables", "[TABLE...]", "show the raw tables",
        "Shows every row of the layout database's tables (Menus, Pages, Boxes).",
        "tables Menus Pages", kView, kParsed, NoOptions, RunTables},

@@ -205,6 +205,23 @@ void Session::Execute(const std::string& line) {
   }
 }
 
+void Session::RunBefore(const std::string& call, const std::string& line) {
+  std::deque<std::string>& queue = beforeCalls_[call];
+  queue.push_back(line);
+  if (queue.size() > 1) return;  // armed already
+  sim::Device::Get().BeforeNext(call, [this, call]() {
+    std::deque<std::string>& waiting = beforeCalls_[call];
+    std::string next = waiting.front();
+    Execute(next);
+    waiting.pop_front();
+    if (!waiting.empty()) {
+      std::string rest = waiting.front();
+      waiting.clear();
+      RunBefore(call, rest);  // re-arms for the call after this one
+    }
+  });
+}
+
 void Session::Expect(const std::vector<std::string>& expectedLines) const {
   std::vector<std::string> expected;
   for (const std::string& line : expectedLines) expected.push_back(Normalized(line));

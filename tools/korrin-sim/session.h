@@ -5,6 +5,7 @@
 
 #include <stddef.h>
 
+#include <deque>
 #include <istream>
 #include <map>
 #include <ostream>
@@ -40,6 +41,10 @@ class Session {
 
   // ---- For the commands.
 
+  // Runs |line| when the engine next makes platform |call|; lines queued for
+  // one call run on its successive calls, in order.
+  void RunBefore(const std::string& call, const std::string& line);
+
   // The layout database on this machine.
   std::string DatabasePath() const;
   // Packages described with `package --held`: not on the device until an
@@ -65,6 +70,7 @@ class Session {
   Snapshot before_;         // the database around the last action
   Snapshot after_;
   std::map<std::string, sim::Package> held_;
+  std::map<std::string, std::deque<std::string> > beforeCalls_;  // lines waiting, by call
 };
 
 // `korrin-sim --help`: every command, one line each, and a first script.
