@@ -42,9 +42,11 @@ const std::vector<std::string> kEventTypes = {"install", "uninstall", "update"};
 const std::vector<std::string> kEventStates = {"started", "processing", "completed", "failed"};
 const std::vector<std::string> kComponents = {"all", "ui", "service"};
 
+// Only the values the platform's type holds: the device keeps states as
+// mdm_status_t, and loading any other value into one is undefined.
 mdm_status_t ParseMdmState(const std::string& text) {
-  if (text == "error") return MDM_STATUS_ERROR;
-  return static_cast<mdm_status_t>(ParseNamed(text, {"allowed", "restricted"}, "state", true));
+  int state = ParseNamed(text, {"error", "allowed", "restricted"}, "state") - 1;
+  return static_cast<mdm_status_t>(state);  // MDM_STATUS_ERROR is -1
 }
 
 // ---- Package and application properties, as options.
@@ -199,38 +201,47 @@ void RunRemove(Session& session, const Args& args) {
   }
 }
 
+// The held package PKGID when the command names nothing but it.
+bool SendsHeld(Session& session, const Args& args) {
+  return session.held().count(args.Text("PKGID")) && args.words().size() == 1;
+}
+
 void RunInstall(Session& session, const Args& args) {
   std::string id = args.Text("PKGID");
-  bool sendHeld = session.held().count(id) && args.words().size() == 1;
-  sim::Package pkg = sendHeld ? session.held()[id] : OneAppPackage(args);
-  session.held().erase(id);
+  bool held = SendsHeld(session, args);
+  sim::Package pkg = held ? session.held()[id] : OneAppPackage(args);
+  if (held) session.held().erase(id);
   Dev().Install(pkg);
+}
+
+// The installed package PKGID with LABEL and the options applied to one of
+// its applications (--app, else the one named PKGID, else the first).
+sim::Package UpdatedPackage(const Args& args) {
+  std::string id = args.Text("PKGID");
+  const sim::Package* installed = Dev().FindPackage(id);
+  if (installed == NULL) throw UsageError("no package '" + id + "' on the device to update");
+  sim::Package pkg = *installed;
+  std::string appId = args.Has("app") ? args.Text("app") : id;
+  std::vector<sim::App>::iterator app = std::find_if(
+      pkg.apps.begin(), pkg.apps.end(), [&](const sim::App& a) { return a.id == appId; });
+  if (app == pkg.apps.end() && args.Has("app")) {
+    pkg.apps.push_back(sim::GameApp(appId, appId));
+    app = pkg.apps.end() - 1;
+  } else if (app == pkg.apps.end()) {
+    if (pkg.apps.empty()) throw UsageError("package '" + id + "' has no application");
+    app = pkg.apps.begin();
+  }
+  if (args.Has("LABEL")) app->label = args.Text("LABEL");
+  ApplyAppOptions(args, *app);
+  ApplyPackageOptions(args, pkg);
+  return pkg;
 }
 
 void RunUpdate(Session& session, const Args& args) {
   std::string id = args.Text("PKGID");
-  sim::Package pkg;
-  if (session.held().count(id) && args.words().size() == 1) {
-    pkg = session.held()[id];
-  } else {
-    const sim::Package* installed = Dev().FindPackage(id);
-    if (installed == NULL) throw UsageError("no package '" + id + "' on the device to update");
-    pkg = *installed;
-    std::string appId = args.Has("app") ? args.Text("app") : id;
-    std::vector<sim::App>::iterator app = std::find_if(
-        pkg.apps.begin(), pkg.apps.end(), [&](const sim::App& a) { return a.id == appId; });
-    if (app == pkg.apps.end() && args.Has("app")) {
-      pkg.apps.push_back(sim::GameApp(appId, appId));
-      app = pkg.apps.end() - 1;
-    } else if (app == pkg.apps.end()) {
-      if (pkg.apps.empty()) throw UsageError("package '" + id + "' has no application");
-      app = pkg.apps.begin();
-    }
-    if (args.Has("LABEL")) app->label = args.Text("LABEL");
-    ApplyAppOptions(args, *app);
-    ApplyPackageOptions(args, pkg);
-  }
-  session.held().erase(id);
+  bool held = SendsHeld(session, args);
+  sim::Package pkg = held ? session.held()[id] : UpdatedPackage(args);
+  if (held) session.held().erase(id);
   Dev().Update(pkg);
 }
 
@@ -328,17 +339,14 @@ void RunOnCard(Session&, const Args& args) {
   }
   LauncherPackageManager& packages = korrin::PackageManager();
   for (const std::string& appId : appIds) {
-    boost::shared_ptr<GameBoxData> info = packages.m_appInfoCache[appId];
-    if (!info) {
-      packages.m_appInfoCache.erase(appId);
-      info.reset(new GameBoxData());
+    if (packages.m_appInfoCache.count(appId) == 0 || !packages.m_appInfoCache[appId]) {
+      boost::shared_ptr<GameBoxData> info(new GameBoxData());
       if (!packages.GetAppInfo(appId, info)) {
         Out() << appId << ": its information cannot be read\n";
         continue;
       }
-      info = packages.m_appInfoCache[appId];
     }
-    info->isOnStorageCard = true;
+    packages.m_appInfoCache[appId]->isOnStorageCard = true;
   }
 }
 
@@ -526,7 +534,7 @@ std::vector<Command> MakeCommands() {
        kAction, kParsed, NoOptions, RunScreen},
       {"mdm", "reachable|unreachable [APPID=STATE...]", "set the policy service",
        "Makes the device-management service reachable or not, and gives applications\n"
-       "a state: allowed, restricted, error or a number. Unnamed ones are allowed.",
+       "a state: allowed, restricted or error. Unnamed ones are allowed.",
        "mdm reachable com.acme.tetra=restricted", kAction, kParsed, NoOptions, RunMdm},
       {"fail", "CALL [ERROR] [once|always]", "make a platform call fail; `fail clear`",
        "Makes platform call CALL (by its C name) return ERROR, an integer such as -22\n"
@@ -594,7 +602,10 @@ std::vector<Command> MakeCommands() {
       {"call", "NAME [ARG...]", "call an operation of the engine's managers",
        "Calls any public operation of LauncherDataManager, LauncherPackageManager,\n"
        "LogClientManager or SystemInfo and prints its result (first line), then its\n"
-       "out-parameters and records, one per line. `call --list` lists them all.",
+       "out-parameters and records, one per line. `call --list` lists them all and\n"
+       "`call --help NAME` describes one. NAME is Class::Name, or Name alone when one\n"
+       "class has it. Words are typed by the parameter: integers, true|false, texts\n"
+       "((null) for a null const char*), records as FIELD=VALUE words.",
        "call GetMenuData 1\ncall GetBoxIdByAppId com.acme.tetra", kAction, kRaw, NoOptions,
        RunCall},
       {"on-card", "APPID...", "mark applications as living on the storage card",
