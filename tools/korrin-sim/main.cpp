@@ -47,7 +47,7 @@ bool UseDeviceRoot(std::string& root) {
 
 int Demo(std::string root) {
   if (!UseDeviceRoot(root)) return 1;
-  std::cout << "device root: " << root << "\n\n";
+  std::cout << "device root: " << root << "\n";
   korrin_sim::Session session(/*printActions=*/false);
   std::istringstream story(kDemoStory);
   return session.RunScript(story, "demo", std::cerr) ? 0 : 1;
@@ -58,15 +58,17 @@ int Run(std::string root, const std::vector<std::string>& files) {
     std::cerr << "korrin-sim: run what? usage: korrin-sim run [--root DIR] FILE...\n";
     return 2;
   }
+  for (const std::string& file : files) {
+    if (!std::ifstream(file)) {
+      std::cerr << "korrin-sim: cannot read " << file << ": " << strerror(errno) << "\n";
+      return 1;
+    }
+  }
   bool temporary = root.empty();
   if (!UseDeviceRoot(root)) return 1;
   korrin_sim::Session session;
   for (const std::string& file : files) {
     std::ifstream in(file);
-    if (!in) {
-      std::cerr << "korrin-sim: cannot read " << file << ": " << strerror(errno) << "\n";
-      return 1;
-    }
     if (!session.RunScript(in, file, std::cerr)) {
       if (temporary) std::cerr << "korrin-sim: the device is left in " << root << "\n";
       return 1;
