@@ -208,17 +208,15 @@ void Session::Execute(const std::string& line) {
 void Session::RunBefore(const std::string& call, const std::string& line) {
   std::deque<std::string>& queue = beforeCalls_[call];
   queue.push_back(line);
-  if (queue.size() > 1) return;  // armed already
+  if (queue.size() == 1) ArmBefore(call);  // otherwise armed already
+}
+
+void Session::ArmBefore(const std::string& call) {
   sim::Device::Get().BeforeNext(call, [this, call]() {
-    std::deque<std::string>& waiting = beforeCalls_[call];
-    std::string next = waiting.front();
+    std::string next = beforeCalls_[call].front();
     Execute(next);
-    waiting.pop_front();
-    if (!waiting.empty()) {
-      std::string rest = waiting.front();
-      waiting.clear();
-      RunBefore(call, rest);  // re-arms for the call after this one
-    }
+    beforeCalls_[call].pop_front();
+    if (!beforeCalls_[call].empty()) ArmBefore(call);  // for the call after this one
   });
 }
 

@@ -63,6 +63,8 @@ class Session {
     boost::program_options::variables_map values;
   };
   Prepared Prepare(const std::string& line) const;
+  // Has the first line waiting for |call| run when the engine next makes it.
+  void ArmBefore(const std::string& call);
 
   bool printActions_;
   std::string lastOutput_;  // what the last command printed
