@@ -133,9 +133,6 @@ void SetField(const RecordType<R>& type, const std::string& word, R& record) {
 // ---- Enumerations by name: each name stands for its position, which is its
 // value on the platform (and in the tracker's job types).
 
-const Words kEventTypes = {"install", "uninstall", "update"};
-const Words kEventStates = {"started", "processing", "completed", "failed"};
-const Words kComponents = {"all", "ui", "service"};
 const Words kJobTypes = {"none", "install", "uninstall", "update"};
 
 std::string Join(const Words& words, const char* between) {
@@ -171,15 +168,8 @@ class Args {
   // too, as the platform may send values its enums do not name.
   int Choice(const Words& names, bool orInteger = false) {
     std::string expected = Join(names, "|") + (orInteger ? " or an integer" : "");
-    std::string word = Next(expected.c_str());
-    for (size_t i = 0; i < names.size(); ++i) {
-      if (word == names[i]) return static_cast<int>(i);
-    }
-    try {
-      if (orInteger) return ParseInt(word, Name());
-    } catch (const UsageError&) {
-    }
-    throw UsageError(Name() + ": '" + word + "' is not " + expected);
+    const std::string& word = Next(expected.c_str());  // before Name(), which names it
+    return ParseNamed(word, names, Name(), orInteger);
   }
   // The remaining words, as a record of FIELD=VALUE words or as a list.
   template <class R>
@@ -372,7 +362,7 @@ void OnHandle(Args& a, std::ostream& out) {
 // printed after the result.
 template <bool (*callback)(package_info_app_component_type_e, const char*, void*)>
 void OnPackageApp(Args& a, std::ostream& out) {
-  int component = a.Choice(kComponents, true);
+  int component = a.Choice(kComponentNames, true);
   const char* id = a.CText();
   a.End();
   Words ids;
@@ -387,8 +377,8 @@ void OnPackageApp(Args& a, std::ostream& out) {
 void OnEvent(Args& a, bool direct) {
   const char* type = a.CText();
   const char* package = a.CText();
-  int eventType = a.Choice(kEventTypes, true);
-  int state = a.Choice(kEventStates, true);
+  int eventType = a.Choice(kEventTypeNames, true);
+  int state = a.Choice(kEventStateNames, true);
   int progress = a.Int();
   int error = a.Int();
   a.End();

@@ -54,6 +54,26 @@ bool ParseBool(const std::string& text, const std::string& what) {
   throw UsageError(what + ": '" + text + "' is not true or false");
 }
 
+int ParseNamed(const std::string& text, const std::vector<std::string>& names,
+               const std::string& what, bool numbers) {
+  std::string all;
+  for (size_t i = 0; i < names.size(); ++i) {
+    if (text == names[i]) return static_cast<int>(i);
+    all += (i > 0 ? "|" : "") + names[i];
+  }
+  if (!numbers) throw UsageError(what + ": '" + text + "' is not " + all);
+  try {
+    return ParseInt(text, what);
+  } catch (const UsageError&) {
+    throw UsageError(what + ": '" + text + "' is not " + all + " or a number");
+  }
+}
+
+const std::vector<std::string> kEventTypeNames = {"install", "uninstall", "update"};
+const std::vector<std::string> kEventStateNames = {"started", "processing", "completed",
+                                                   "failed"};
+const std::vector<std::string> kComponentNames = {"all", "ui", "service"};
+
 std::string Quote(const std::string& text) {
   std::string out = "\"";
   for (unsigned char c : text) {

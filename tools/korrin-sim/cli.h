@@ -30,6 +30,17 @@ long long ParseInt64(const std::string& text, const std::string& what);
 unsigned int ParseUnsigned(const std::string& text, const std::string& what);
 bool ParseBool(const std::string& text, const std::string& what);  // true|false|1|0
 
+// |text| as one of |names| (its position), or, with |numbers|, as any
+// integer: the platform may send values its enums do not name.
+int ParseNamed(const std::string& text, const std::vector<std::string>& names,
+               const std::string& what, bool numbers = false);
+
+// Enum values by name, each standing for its position, which is its value on
+// the platform.
+extern const std::vector<std::string> kEventTypeNames;   // package_manager_event_type_e
+extern const std::vector<std::string> kEventStateNames;  // package_manager_event_state_e
+extern const std::vector<std::string> kComponentNames;   // package_info_app_component_type_e
+
 // A text value as results print it: in double quotes, with \" and \\ escaped
 // and other bytes below 0x20 as \n, \t or \xHH.
 std::string Quote(const std::string& text);

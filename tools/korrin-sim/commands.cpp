@@ -23,25 +23,6 @@ sim::Device& Dev() { return sim::Device::Get(); }
 
 // ---- Values that scripts name.
 
-// |text| as one of |names| (their index), or as any integer when |numbers|.
-int ParseNamed(const std::string& text, const std::vector<std::string>& names,
-               const std::string& what, bool numbers = false) {
-  std::vector<std::string>::const_iterator it = std::find(names.begin(), names.end(), text);
-  if (it != names.end()) return static_cast<int>(it - names.begin());
-  std::string all;
-  for (const std::string& name : names) all += (all.empty() ? "" : "|") + name;
-  if (!numbers) throw UsageError(what + ": '" + text + "' is not " + all);
-  try {
-    return ParseInt(text, what);
-  } catch (const UsageError&) {
-    throw UsageError(what + ": '" + text + "' is not " + all + " or a number");
-  }
-}
-
-const std::vector<std::string> kEventTypes = {"install", "uninstall", "update"};
-const std::vector<std::string> kEventStates = {"started", "processing", "completed", "failed"};
-const std::vector<std::string> kComponents = {"all", "ui", "service"};
-
 // Only the values the platform's type holds: the device keeps states as
 // mdm_status_t, and loading any other value into one is undefined.
 mdm_status_t ParseMdmState(const std::string& text) {
@@ -117,7 +98,7 @@ void ApplyAppOptions(const Args& args, sim::App& app) {
   Set(args, "task-manage", changed.taskManage);
   if (args.Has("component")) {
     changed.component = static_cast<package_info_app_component_type_e>(
-        ParseNamed(args.Text("component"), kComponents, "--component", true));
+        ParseNamed(args.Text("component"), kComponentNames, "--component", true));
   }
   if (args.Has("category")) changed.categories = args.List("category");
   if (args.Has("metadata")) {
@@ -167,6 +148,11 @@ void Store(Session& session, const sim::Package& pkg, bool hold) {
 
 // ---- The commands.
 
+std::vector<sim::App>::iterator FindApp(sim::Package& pkg, const std::string& appId) {
+  return std::find_if(pkg.apps.begin(), pkg.apps.end(),
+                      [&](const sim::App& app) { return app.id == appId; });
+}
+
 void RunGame(Session&, const Args& args) {
   sim::Package pkg = sim::MakePackage(
       args.Text("APPID"), {sim::GameApp(args.Text("APPID"), args.Text("LABEL"))});
@@ -184,12 +170,8 @@ void RunPackage(Session& session, const Args& args) {
 void RunApp(Session& session, const Args& args) {
   sim::Package pkg = DescribedPackage(session, args.Text("PKGID"));
   std::string appId = args.Text("APPID");
-  std::vector<sim::App>::iterator app = std::find_if(
-      pkg.apps.begin(), pkg.apps.end(), [&](const sim::App& a) { return a.id == appId; });
-  if (app == pkg.apps.end()) {
-    pkg.apps.push_back(sim::PlainApp(appId, appId));
-    app = pkg.apps.end() - 1;
-  }
+  std::vector<sim::App>::iterator app = FindApp(pkg, appId);
+  if (app == pkg.apps.end()) app = pkg.apps.insert(app, sim::PlainApp(appId, appId));
   ApplyAppOptions(args, *app);
   Store(session, pkg, false);
 }
@@ -222,11 +204,9 @@ sim::Package UpdatedPackage(const Args& args) {
   if (installed == NULL) throw UsageError("no package '" + id + "' on the device to update");
   sim::Package pkg = *installed;
   std::string appId = args.Has("app") ? args.Text("app") : id;
-  std::vector<sim::App>::iterator app = std::find_if(
-      pkg.apps.begin(), pkg.apps.end(), [&](const sim::App& a) { return a.id == appId; });
+  std::vector<sim::App>::iterator app = FindApp(pkg, appId);
   if (app == pkg.apps.end() && args.Has("app")) {
-    pkg.apps.push_back(sim::GameApp(appId, appId));
-    app = pkg.apps.end() - 1;
+    app = pkg.apps.insert(app, sim::GameApp(appId, appId));
   } else if (app == pkg.apps.end()) {
     if (pkg.apps.empty()) throw UsageError("package '" + id + "' has no application");
     app = pkg.apps.begin();
@@ -252,8 +232,8 @@ void RunUninstall(Session&, const Args& args) {
 }
 
 void RunEvent(Session&, const Args& args) {
-  int type = ParseNamed(args.Text("EVENT"), kEventTypes, "EVENT", true);
-  int state = ParseNamed(args.Text("STATE"), kEventStates, "STATE", true);
+  int type = ParseNamed(args.Text("EVENT"), kEventTypeNames, "EVENT", true);
+  int state = ParseNamed(args.Text("STATE"), kEventStateNames, "STATE", true);
   Dev().EmitPackageEvent(args.Text("pkg-type"), args.Text("PKGID"), type, state,
                          args.Get<int>("progress"), args.Get<int>("error"));
 }

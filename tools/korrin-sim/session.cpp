@@ -300,7 +300,7 @@ void PrintCommandHelp(const std::string& name, std::ostream& out) {
   const Command* command = FindCommand(name);
   if (command == NULL) throw UsageError("no command '" + name + "' (`help` lists them)");
   out << "usage: " << command->name << (command->args.empty() ? "" : " " + command->args)
-      << (command->options ? "" : "") << "\n\n"
+      << "\n\n"
       << command->details << "\n";
   po::options_description options = VisibleOptions(*command);
   if (!options.options().empty()) out << "\n" << options;
