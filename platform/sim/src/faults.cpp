@@ -113,4 +113,16 @@ int Device::CallCount(const std::string& call) const {
   return count == TheState().callCounts.end() ? 0 : count->second;
 }
 
+std::vector<std::string> Device::PlatformCalls() {
+  std::set<std::string> calls = FailableCalls();
+  calls.insert(CountedCalls().begin(), CountedCalls().end());
+  return std::vector<std::string>(calls.begin(), calls.end());
+}
+
+bool Device::CanFail(const std::string& call) {
+  if (FailableCalls().count(call) != 0) return true;
+  if (CountedCalls().count(call) != 0) return false;
+  throw std::invalid_argument("no platform call " + call);
+}
+
 }  // namespace sim

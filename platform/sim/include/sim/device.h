@@ -164,6 +164,11 @@ class Device {
   void BeforeNext(const std::string& call, std::function<void()> action);
   // How often |call| was made since the last Reset.
   int CallCount(const std::string& call) const;
+  // Every platform call known by name here, in name order: those with a
+  // result, which can be made to fail, and those without, only counted.
+  static std::vector<std::string> PlatformCalls();
+  // Whether |call| has a result, and so can be made to fail.
+  static bool CanFail(const std::string& call);
 
   // ---- Handles: what the platform handed out and nobody released yet
   // (application and package information, filters, package-manager clients,
