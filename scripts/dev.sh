@@ -4,6 +4,10 @@
 #   scripts/dev.sh test       the whole test suite
 #   scripts/dev.sh sanitize   the whole test suite under ASan and UBSan
 #   scripts/dev.sh bench      the benchmarks (a Release build of their own)
+#   scripts/dev.sh fuzz [SECONDS]
+#                             the fuzzer for SECONDS (default 600), keeping what it
+#                             finds in build-fuzz/work (or $KORRIN_FUZZ_WORK)
+# `test` also builds the fuzzer with clang and gives it a short, fixed run.
 # Missing Debian packages are installed with apt-get (as root) only when missing.
 set -euo pipefail
 cd "$(dirname "$0")/.."
@@ -41,6 +45,14 @@ run_tests() {
   ctest --test-dir "$1" -j"$(nproc)" --output-on-failure
 }
 
+# The fuzz target, built by clang with libFuzzer and the sanitizers, and only it.
+fuzz_packages=(clang libclang-rt-14-dev)
+build_fuzzer() {
+  cmake -S . -B build-fuzz -DCMAKE_C_COMPILER=clang -DCMAKE_CXX_COMPILER=clang++ \
+    -DKORRIN_FUZZ=ON -DKORRIN_TESTS=OFF >/dev/null
+  cmake --build build-fuzz -j"$(nproc)" --target korrin-fuzz
+}
+
 case "${1:-}" in
   demo)
     install_missing_packages
@@ -48,9 +60,11 @@ case "${1:-}" in
     exec build/tools/korrin-sim/korrin-sim demo
     ;;
   test)
-    install_missing_packages
+    install_missing_packages "${fuzz_packages[@]}"
     build build
     run_tests build
+    build_fuzzer
+    run_tests build-fuzz
     ;;
   sanitize)
     install_missing_packages
@@ -64,8 +78,25 @@ case "${1:-}" in
     build build-bench -DCMAKE_BUILD_TYPE=Release -DKORRIN_BENCHMARKS=ON -DKORRIN_TESTS=OFF
     build-bench/bench/korrin-bench
     ;;
+  fuzz)
+    seconds=${2:-600}
+    install_missing_packages "${fuzz_packages[@]}"
+    build_fuzzer
+    # New inputs go to the work corpus, never into fuzz/corpus; crashes beside it.
+    work=${KORRIN_FUZZ_WORK:-build-fuzz/work}
+    mkdir -p "$work/corpus" "$work/crashes"
+    set +e
+    build-fuzz/fuzz/korrin-fuzz -max_total_time="$seconds" -timeout=60 -print_final_stats=1 \
+      -dict=fuzz/korrin.dict -artifact_prefix="$work/crashes/" "$work/corpus" fuzz/corpus \
+      2>&1 | tee "$work/last-run.log"
+    status=${PIPESTATUS[0]}
+    set -e
+    runs=$(sed -n 's/^stat::number_of_executed_units: *//p' "$work/last-run.log")
+    echo "dev.sh: ${runs:-no} executions in ${seconds} s; log in $work/last-run.log" >&2
+    exit "$status"
+    ;;
   *)
-    echo "usage: scripts/dev.sh demo|test|sanitize|bench" >&2
+    echo "usage: scripts/dev.sh demo|test|sanitize|bench|fuzz [SECONDS]" >&2
     exit 2
     ;;
 esac

@@ -152,7 +152,9 @@ bool FindCellAfterLastBox(LauncherDataManager& store, int parentId, bool isFolde
   // A last box in row 0 starts a new page rather than being followed in row 1;
   // kept as the launcher expects it.
   if (lastRow >= rowBound || lastRow == 0) {
-    cell->pageId = InsertPage(store, parentId, isFolder, last->pageNo + 1);
+    // A stored pageNo may be INT_MAX; the number wraps, as on the device.
+    int pageNo = static_cast<int>(static_cast<unsigned>(last->pageNo) + 1u);
+    cell->pageId = InsertPage(store, parentId, isFolder, pageNo);
     cell->row = 1;
     *pageAdded = true;
   } else {

@@ -1,6 +1,8 @@
 // Where a new application's box goes.
 #include "launcher-data-manager/store-test.h"
 
+#include <limits.h>
+
 #include <functional>
 
 namespace {
@@ -63,6 +65,8 @@ TEST_F(PlacementTest, NextAppGoesAfterTheLastBoxOfTheLastPage) {
        "2:1,1", false},
       {"row 0 at the fourth column: a new page", [&] { AddBox(AddPage(apps, 3), "a", 4, 0); },
        "4:1,1", true},
+      {"a new page after page INT_MAX: its number wraps",
+       [&] { AddBox(AddPage(apps, INT_MAX), "a", 4, 0); }, "-2147483648:1,1", true},
       {"row 0 short of the fourth column: followed", [&] { AddBox(AddPage(apps, 5), "a", 2, 0); },
        "5:3,0", false},
   };
