@@ -3,8 +3,8 @@
 // answers its failure value; once the lock is gone everything works again and
 // every row written before it is still there.
 //
-// "Immediate" is shown without a clock. The store's connection goes through a
-// VFS over "unix" that counts the lock requests the file refused: one try and
+// "Immediate" is shown without a clock. The store's connection goes through the
+// file shim, which counts the lock requests the file refused: one try and
 // five retries make six. The operations run on a thread where a seccomp
 // filter turns every system call that waits for time into a counted SIGSYS,
 // so any sleep between the retries, SQLite's or the handler's own, shows.
@@ -28,6 +28,7 @@
 #include "engine/engine-test.h"
 #include "launcher-data-manager/launcher-data-manager.h"
 #include "launcher-package-manager/launcher-package-manager.h"
+#include "support/file-shim.h"
 #include "support/sim-test.h"
 #include "support/sql-probe.h"
 
@@ -36,81 +37,15 @@ namespace {
 // ---- The watching VFS.
 
 int g_refusedLocks = 0;
-sqlite3_vfs* g_unix = NULL;
 
-struct WatchedFile {
-  sqlite3_file base;
-  sqlite3_file* real;  // the unix file, kept just after this one
-};
-
-sqlite3_file* Real(sqlite3_file* f) { return reinterpret_cast<WatchedFile*>(f)->real; }
-
-int Lock(sqlite3_file* f, int level) {
-  int rc = Real(f)->pMethods->xLock(Real(f), level);
-  if (rc == SQLITE_BUSY) ++g_refusedLocks;
-  return rc;
-}
-
-// Version 1: no shared memory and no memory mapping, which a rollback
-// journal does not use.
-sqlite3_io_methods MakeWatchedMethods() {
-  sqlite3_io_methods methods = {};
-  methods.iVersion = 1;
-  methods.xClose = [](sqlite3_file* f) { return Real(f)->pMethods->xClose(Real(f)); };
-  methods.xRead = [](sqlite3_file* f, void* p, int n, sqlite3_int64 at) {
-    return Real(f)->pMethods->xRead(Real(f), p, n, at);
-  };
-  methods.xWrite = [](sqlite3_file* f, const void* p, int n, sqlite3_int64 at) {
-    return Real(f)->pMethods->xWrite(Real(f), p, n, at);
-  };
-  methods.xTruncate = [](sqlite3_file* f, sqlite3_int64 size) {
-    return Real(f)->pMethods->xTruncate(Real(f), size);
-  };
-  methods.xSync = [](sqlite3_file* f, int flags) {
-    return Real(f)->pMethods->xSync(Real(f), flags);
-  };
-  methods.xFileSize = [](sqlite3_file* f, sqlite3_int64* size) {
-    return Real(f)->pMethods->xFileSize(Real(f), size);
-  };
-  methods.xLock = Lock;
-  methods.xUnlock = [](sqlite3_file* f, int level) {
-    return Real(f)->pMethods->xUnlock(Real(f), level);
-  };
-  methods.xCheckReservedLock = [](sqlite3_file* f, int* out) {
-    return Real(f)->pMethods->xCheckReservedLock(Real(f), out);
-  };
-  methods.xFileControl = [](sqlite3_file* f, int op, void* arg) {
-    return Real(f)->pMethods->xFileControl(Real(f), op, arg);
-  };
-  methods.xSectorSize = [](sqlite3_file* f) { return Real(f)->pMethods->xSectorSize(Real(f)); };
-  methods.xDeviceCharacteristics = [](sqlite3_file* f) {
-    return Real(f)->pMethods->xDeviceCharacteristics(Real(f));
-  };
-  return methods;
-}
-
-const sqlite3_io_methods kWatchedMethods = MakeWatchedMethods();
-
-int OpenWatched(sqlite3_vfs*, const char* name, sqlite3_file* file, int flags, int* outFlags) {
-  WatchedFile* watched = reinterpret_cast<WatchedFile*>(file);
-  watched->real = reinterpret_cast<sqlite3_file*>(watched + 1);
-  int rc = g_unix->xOpen(g_unix, name, watched->real, flags, outFlags);
-  watched->base.pMethods = watched->real->pMethods != NULL ? &kWatchedMethods : NULL;
-  return rc;
-}
-
-// Makes the watching VFS the default, so that db_util_open's plain
-// sqlite3_open goes through it.
+// Makes the file shim the default VFS, counting the lock requests the file
+// refused, so that db_util_open's plain sqlite3_open goes through it.
 void WatchTheFile() {
-  static sqlite3_vfs vfs;
-  if (g_unix == NULL) {
-    g_unix = sqlite3_vfs_find("unix");
-    vfs = *g_unix;
-    vfs.zName = "watched";
-    vfs.szOsFile = static_cast<int>(sizeof(WatchedFile)) + g_unix->szOsFile;
-    vfs.xOpen = OpenWatched;
-  }
-  ASSERT_EQ(SQLITE_OK, sqlite3_vfs_register(&vfs, 1));
+  ASSERT_EQ(SQLITE_OK, fileshim::Install([](fileshim::Op op, const std::function<int()>& perform) {
+              int rc = perform();
+              if (op == fileshim::Op::kLock && rc == SQLITE_BUSY) ++g_refusedLocks;
+              return rc;
+            }));
 }
 
 // ---- Catching sleeps.

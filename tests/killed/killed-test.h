@@ -4,8 +4,10 @@
 // The engine's managers live as long as the process, so every start of the
 // engine is a child of its own, forked from a test process that never starts
 // it: each child begins from the library as loaded. Kill points are numbered
-// file operations of the kill shim, spread over a range by a seed, so that a
-// failing kill can be run again exactly.
+// file operations that change files (writes, syncs, truncates, deletes), seen
+// through the file shim and spread over a range by a seed. A process that runs
+// the same statements on the same files makes the same operations in the same
+// order, so a failing kill can be run again exactly.
 #ifndef KORRIN_TESTS_KILLED_KILLED_TEST_H_
 #define KORRIN_TESTS_KILLED_KILLED_TEST_H_
 
@@ -13,15 +15,21 @@
 #include <string>
 #include <vector>
 
-#include "killed/kill-vfs.h"
 #include "support/sim-test.h"
 #include "support/sql-probe.h"
 
 typedef std::vector<std::string> Lines;
 
+// Where a child dies, with SIGKILL: at file operation |op|, counted from 1 in
+// the child, before it reaches the file or just after. Op 0 never comes.
+struct KillPoint {
+  long op = 0;
+  bool afterIt = false;
+};
+
 // One kill of a plan, and how to find it again.
 struct Kill {
-  killvfs::KillPoint point;
+  KillPoint point;
   int number;       // from 1
   int of;           // kills in the plan
   unsigned seed;    // of the plan
@@ -44,9 +52,9 @@ class KilledTest : public SimTest {
     long operations;  // file operations it made, when it ran to the end
     Lines logs;       // what the engine logged meanwhile, as EngineMessages gives it
   };
-  // Runs |body| in a child whose connections go through the kill shim, with
-  // |kill| set. A child that neither ends nor dies by SIGKILL fails the test.
-  Run RunChild(killvfs::KillPoint kill, const std::function<void()>& body);
+  // Runs |body| in a child whose connections go through the file shim, dying
+  // at |kill|. A child that neither ends nor dies by SIGKILL fails the test.
+  Run RunChild(KillPoint kill, const std::function<void()>& body);
   // Runs |body| in a child to the end.
   Run RunToTheEnd(const std::function<void()>& body);
   // Starts the engine in a fresh child after |before|, runs it to the end and
