@@ -3,7 +3,9 @@
 #   scripts/dev.sh demo       the simulator's demo
 #   scripts/dev.sh test       the whole test suite
 #   scripts/dev.sh sanitize   the whole test suite under ASan and UBSan
-#   scripts/dev.sh bench      the benchmarks (a Release build of their own)
+#   scripts/dev.sh bench [ARGS]
+#                             the benchmarks (a Release build of their own);
+#                             ARGS go to Google Benchmark
 #   scripts/dev.sh fuzz [SECONDS]
 #                             the fuzzer for SECONDS (default 600), keeping what it
 #                             finds in build-fuzz/work (or $KORRIN_FUZZ_WORK)
@@ -76,7 +78,11 @@ case "${1:-}" in
   bench)
     install_missing_packages libbenchmark-dev
     build build-bench -DCMAKE_BUILD_TYPE=Release -DKORRIN_BENCHMARKS=ON -DKORRIN_TESTS=OFF
-    build-bench/bench/korrin-bench
+    # One table: each operation on a disk file and on /dev/shm (tmpfs), its
+    # SQLite floor, the store, and store / floor. Extra arguments go to the
+    # harness (--benchmark_filter=..., --benchmark_repetitions=N).
+    shift
+    build-bench/bench/korrin-bench "$@"
     ;;
   fuzz)
     seconds=${2:-600}
