@@ -13,10 +13,47 @@ namespace {
 
 const int kProcessingProgress = 60;
 
-std::vector<Package>::iterator PackageNamed(const std::string& pkgId) {
-  std::vector<Package>& packages = TheState().packages;
-  return std::find_if(packages.begin(), packages.end(),
-                      [&](const Package& pkg) { return pkg.id == pkgId; });
+const size_t kNowhere = static_cast<size_t>(-1);
+
+// Adds the package at |p| of the list, behind every other: an application id
+// already known keeps its first place.
+void IndexPackage(PackageIndex& index, const Package& pkg, size_t p) {
+  index.packages.emplace(pkg.id, p);
+  for (size_t a = 0; a < pkg.apps.size(); ++a) {
+    index.apps.emplace(pkg.apps[a].id, std::make_pair(p, a));
+  }
+}
+
+// The index, fresh; NULL while packages are lent out to be changed in place.
+const PackageIndex* Index() {
+  State& state = TheState();
+  PackageIndex& index = state.index;
+  if (index.lent) return NULL;
+  if (!index.fresh) {
+    index.packages.clear();
+    index.apps.clear();
+    for (size_t p = 0; p < state.packages.size(); ++p) IndexPackage(index, state.packages[p], p);
+    index.fresh = true;
+  }
+  return &index;
+}
+
+size_t PackageNamed(const std::string& pkgId) {
+  const std::vector<Package>& packages = TheState().packages;
+  if (const PackageIndex* index = Index()) {
+    std::unordered_map<std::string, size_t>::const_iterator found = index->packages.find(pkgId);
+    return found == index->packages.end() ? kNowhere : found->second;
+  }
+  for (size_t p = 0; p < packages.size(); ++p) {
+    if (packages[p].id == pkgId) return p;
+  }
+  return kNowhere;
+}
+
+// Before a change other than an append: the index is rebuilt when next asked.
+void Changing() {
+  TheState().index.fresh = false;
+  TheState().index.lent = false;
 }
 
 // STARTED and PROCESSING, then |change| to the device, then COMPLETED.
@@ -35,12 +72,19 @@ void PlayOperation(const std::string& type, const std::string& pkgId, int eventT
 }  // namespace
 
 const Package* InstalledPackage(const std::string& pkgId) {
-  std::vector<Package>::iterator found = PackageNamed(pkgId);
-  return found == TheState().packages.end() ? NULL : &*found;
+  size_t p = PackageNamed(pkgId);
+  return p == kNowhere ? NULL : &TheState().packages[p];
 }
 
 std::pair<const Package*, const App*> InstalledApp(const std::string& appId) {
-  for (const Package& pkg : TheState().packages) {
+  const std::vector<Package>& packages = TheState().packages;
+  if (const PackageIndex* index = Index()) {
+    auto found = index->apps.find(appId);
+    if (found == index->apps.end()) return std::pair<const Package*, const App*>(NULL, NULL);
+    const Package& pkg = packages[found->second.first];
+    return std::make_pair(&pkg, &pkg.apps[found->second.second]);
+  }
+  for (const Package& pkg : packages) {
     for (const App& app : pkg.apps) {
       if (app.id == appId) return std::make_pair(&pkg, &app);
     }
@@ -74,11 +118,16 @@ Package MakePackage(const std::string& pkgId, std::vector<App> apps) {
 }
 
 void Device::AddPackage(const Package& pkg) {
-  std::vector<Package>::iterator found = PackageNamed(pkg.id);
-  if (found != TheState().packages.end()) {
-    *found = pkg;
-  } else {
-    TheState().packages.push_back(pkg);
+  State& state = TheState();
+  size_t p = PackageNamed(pkg.id);
+  if (p != kNowhere) {
+    Changing();
+    state.packages[p] = pkg;
+    return;
+  }
+  state.packages.push_back(pkg);
+  if (state.index.fresh && !state.index.lent) {
+    IndexPackage(state.index, state.packages.back(), state.packages.size() - 1);
   }
 }
 
@@ -91,20 +140,25 @@ void Device::AddApp(const std::string& appId, const std::string& label) {
 }
 
 bool Device::RemovePackage(const std::string& pkgId) {
-  std::vector<Package>::iterator found = PackageNamed(pkgId);
-  if (found == TheState().packages.end()) return false;
-  TheState().packages.erase(found);
+  size_t p = PackageNamed(pkgId);
+  if (p == kNowhere) return false;
+  Changing();
+  TheState().packages.erase(TheState().packages.begin() + p);
   return true;
 }
 
 const std::vector<Package>& Device::Packages() const { return TheState().packages; }
 
 Package* Device::FindPackage(const std::string& pkgId) {
-  return const_cast<Package*>(InstalledPackage(pkgId));
+  Package* found = const_cast<Package*>(InstalledPackage(pkgId));
+  if (found != NULL) TheState().index.lent = true;
+  return found;
 }
 
 App* Device::FindApp(const std::string& appId) {
-  return const_cast<App*>(InstalledApp(appId).second);
+  App* found = const_cast<App*>(InstalledApp(appId).second);
+  if (found != NULL) TheState().index.lent = true;
+  return found;
 }
 
 // |pkg| is copied first: it may be a package of the device that a listener changes.

@@ -13,6 +13,7 @@
 #include <map>
 #include <optional>
 #include <string>
+#include <unordered_map>
 #include <utility>
 #include <vector>
 
@@ -97,6 +98,18 @@ struct Held {
   int mdmConnections = 0;
 };
 
+// Where each package, and the first application of each id, stands in the
+// list, so that opening one by id does not walk thousands of packages. An
+// append keeps it; any other change leaves it to be rebuilt at the next
+// look-up. While FindPackage or FindApp has lent a package out, its ids may
+// change behind the index, so look-ups walk the list until the next change.
+struct PackageIndex {
+  bool fresh = false;
+  bool lent = false;
+  std::unordered_map<std::string, size_t> packages;
+  std::unordered_map<std::string, std::pair<size_t, size_t>> apps;  // package, app
+};
+
 struct State {
   // Records.
   std::vector<LogLine> logs;
@@ -106,6 +119,7 @@ struct State {
 
   // What the device holds.
   std::vector<Package> packages;
+  PackageIndex index;
   std::map<std::string, int> preferences;
   std::map<std::string, int> systemInfo;  // keys without "http://"
   bool mdmReachable = true;
