@@ -6,7 +6,9 @@
 #include <limits.h>
 #include <math.h>
 
-#include <sstream>
+#include <utility>
+
+#include <boost/make_shared.hpp>
 
 #include "common/device-path.h"
 #include "common/log.h"
@@ -278,7 +280,7 @@ bool LauncherDataManager::RollbackTransaction() {
 // Menus
 
 int LauncherDataManager::InsertMenuData(GameViewData& menu) {
-  std::stringstream sql;
+  korrin::SqlText sql;
   sql << "INSERT INTO menus(name, type) VALUES($name, " << menu.type << ")";
   Statement stmt(m_db, sql.str(), kPrepareV2);
   if (!stmt.IsCompiled()) return -1;
@@ -288,8 +290,8 @@ int LauncherDataManager::InsertMenuData(GameViewData& menu) {
 }
 
 MenuPtr LauncherDataManager::GetMenuData(int menuId) {
-  MenuPtr menu(new GameViewData);
-  std::stringstream sql;
+  MenuPtr menu = boost::make_shared<GameViewData>();
+  korrin::SqlText sql;
   sql << "SELECT name, type FROM menus WHERE menuId = " << menuId;
   Statement stmt(m_db, sql.str(), kPrepareLegacy);
   if (!stmt.Step()) return menu;
@@ -300,7 +302,7 @@ MenuPtr LauncherDataManager::GetMenuData(int menuId) {
 }
 
 bool LauncherDataManager::UpdateMenuData(GameViewData& menu) {
-  std::stringstream sql;
+  korrin::SqlText sql;
   sql << "UPDATE menus SET name = $name, type = " << menu.type
       << " WHERE menuId = " << menu.menuId;
   Statement stmt(m_db, sql.str(), kPrepareV2);
@@ -311,7 +313,7 @@ bool LauncherDataManager::UpdateMenuData(GameViewData& menu) {
 }
 
 bool LauncherDataManager::DeleteMenuData(int menuId) {
-  std::stringstream sql;
+  korrin::SqlText sql;
   sql << "DELETE FROM menus WHERE menuid = " << menuId;
   return ExecStatement(m_db, sql.str(), NULL);
 }
@@ -326,11 +328,11 @@ std::vector<MenuPtr> LauncherDataManager::GetMenuDataList() {
   Statement stmt(m_db, "SELECT menuId, name, type FROM menus ORDER BY menuId DESC",
                  kPrepareLegacy);
   while (stmt.Step()) {
-    MenuPtr menu(new GameViewData);
+    MenuPtr menu = boost::make_shared<GameViewData>();
     menu->menuId = stmt.Int(0);
     menu->name = stmt.Text(1);
     menu->type = stmt.Int(2);
-    menus.push_back(menu);
+    menus.push_back(std::move(menu));
   }
   return menus;
 }
@@ -339,7 +341,7 @@ std::vector<MenuPtr> LauncherDataManager::GetMenuDataList() {
 // Pages
 
 int LauncherDataManager::InsertPageData(GamePageData& page) {
-  std::stringstream sql;
+  korrin::SqlText sql;
   sql << "INSERT INTO pages(isFolder, parentId, pageNo) VALUES(" << page.isFolder << ", "
       << page.parentId << ", " << page.pageNo << ")";
   Statement stmt(m_db, sql.str(), kPrepareV2);
@@ -349,7 +351,7 @@ int LauncherDataManager::InsertPageData(GamePageData& page) {
 }
 
 bool LauncherDataManager::UpdatePageData(GamePageData& page) {
-  std::stringstream sql;
+  korrin::SqlText sql;
   sql << "UPDATE pages SET parentId = " << page.parentId << ", pageNo = " << page.pageNo
       << " WHERE pageId = " << page.pageId;
   Statement stmt(m_db, sql.str(), kPrepareV2);
@@ -359,20 +361,20 @@ bool LauncherDataManager::UpdatePageData(GamePageData& page) {
 }
 
 bool LauncherDataManager::DeletePageData(int pageId) {
-  std::stringstream sql;
+  korrin::SqlText sql;
   sql << "DELETE FROM pages WHERE pageid = " << pageId;
   return ExecStatement(m_db, sql.str(), NULL);
 }
 
 bool LauncherDataManager::DeleteFolderPageData(int folderBoxId) {
-  std::stringstream sql;
+  korrin::SqlText sql;
   sql << "DELETE FROM pages WHERE parentId = " << folderBoxId;
   return ExecStatement(m_db, sql.str(), NULL);
 }
 
 PagePtr LauncherDataManager::GetMenuPageData(int pageId) {
-  PagePtr page(new GamePageData);
-  std::stringstream sql;
+  PagePtr page = boost::make_shared<GamePageData>();
+  korrin::SqlText sql;
   sql << "SELECT isFolder, parentId, pageNo FROM pages WHERE pageId = " << pageId;
   Statement stmt(m_db, sql.str(), kPrepareLegacy);
   if (!stmt.Step()) return page;
@@ -386,14 +388,14 @@ PagePtr LauncherDataManager::GetMenuPageData(int pageId) {
 int LauncherDataManager::GetPageDataCount(int menuId, bool isFolder) {
   // Lacks a comparison after isFolder and names a column Pages does not have:
   // it never compiles, and the launcher relies on the 0 that follows.
-  std::stringstream sql;
+  korrin::SqlText sql;
   sql << "SELECT COUNT(*) FROM pages WHERE isFolder " << isFolder << " AND menuId = " << menuId;
   Statement stmt(m_db, sql.str(), kPrepareLegacy);
   return stmt.Step() ? stmt.Int(0) : 0;
 }
 
 int LauncherDataManager::_GetPageDataCountByDownload(int) {
-  std::stringstream sql;
+  korrin::SqlText sql;
   sql << "SELECT COUNT(*) "
       << "FROM boxes b, pages p ON p.pageId = b.pageId "
       << "WHERE b.isFolder = 0 AND b.IsPreload = 0";
@@ -411,7 +413,7 @@ bool LauncherDataManager::DeletePageDataForAlphaBeticalOrder(int) { return false
 // Boxes
 
 int LauncherDataManager::InsertBoxData(GameBoxData& box) {
-  std::stringstream sql;
+  korrin::SqlText sql;
   if (box.isFolder) {
     sql << "INSERT INTO boxes(isFolder, pageId, name, appId, col, row, isPreload, isSystem, "
            "boxType, launchType) "
@@ -440,7 +442,7 @@ int LauncherDataManager::InsertBoxData(GameBoxData& box) {
 }
 
 bool LauncherDataManager::UpdateBoxData(GameBoxData& box) {
-  std::stringstream sql;
+  korrin::SqlText sql;
   if (box.isFolder) {
     // A folder is never a system box, whatever the record says.
     sql << "UPDATE boxes set isFolder = 1, pageId = " << box.pageId << ", "
@@ -469,7 +471,7 @@ bool LauncherDataManager::UpdateBoxData(GameBoxData& box) {
 }
 
 bool LauncherDataManager::DeleteBoxData(int boxId) {
-  std::stringstream sql;
+  korrin::SqlText sql;
   sql << "DELETE FROM boxes WHERE boxid = " << boxId;
   std::string error;
   if (!ExecStatement(m_db, sql.str(), &error)) {
@@ -480,8 +482,8 @@ bool LauncherDataManager::DeleteBoxData(int boxId) {
 }
 
 BoxPtr LauncherDataManager::GetMenuBoxData(int boxId) {
-  BoxPtr box(new GameBoxData);
-  std::stringstream sql;
+  BoxPtr box = boost::make_shared<GameBoxData>();
+  korrin::SqlText sql;
   sql << "SELECT b.isFolder, p.pageId, col, row, appId, name, p.parentId, isPreload, isSystem, "
          "boxType, launchType, iconPath, content FROM boxes b, pages p ON b.pageId = p.pageId "
          "WHERE boxId = "
@@ -496,7 +498,7 @@ BoxPtr LauncherDataManager::GetMenuBoxData(int boxId) {
 
 bool LauncherDataManager::GetBoxIdByAppId(std::string appId, int* parentId, int* pageId,
                                           int* boxId) {
-  std::stringstream sql;
+  korrin::SqlText sql;
   sql << "SELECT boxId, b.pageId, p.parentId FROM boxes b, pages p ON p.pageId = b.pageId  "
          "WHERE b.appId = $appId AND b.boxType != "
       << kShortcutBoxType << " ";
@@ -511,8 +513,8 @@ bool LauncherDataManager::GetBoxIdByAppId(std::string appId, int* parentId, int*
 }
 
 BoxPtr LauncherDataManager::GetBoxDataByAppId(std::string appId) {
-  BoxPtr box(new GameBoxData);
-  std::stringstream sql;
+  BoxPtr box = boost::make_shared<GameBoxData>();
+  korrin::SqlText sql;
   sql << "SELECT b.boxId, b.isFolder, p.pageId, col, row, appId, name, p.parentId, isPreload, "
          "isSystem FROM boxes b, pages p ON b.pageId = p.pageId WHERE b.appId = $appId AND "
          "b.boxType != "
@@ -533,7 +535,7 @@ BoxPtr LauncherDataManager::GetBoxDataByAppId(std::string appId) {
 }
 
 int LauncherDataManager::GetBoxDataCount(int pageId) {
-  std::stringstream sql;
+  korrin::SqlText sql;
   sql << "SELECT COUNT(*) FROM boxes WHERE pageId = " << pageId;
   Statement stmt(m_db, sql.str(), kPrepareLegacy);
   return stmt.Step() ? stmt.Int(0) : 0;
@@ -544,43 +546,43 @@ int LauncherDataManager::GetBoxDataCount(int pageId) {
 
 std::vector<PagePtr> LauncherDataManager::GetPageDataList(int parentId, bool isFolder) {
   std::vector<PagePtr> pages;
-  std::stringstream sql;
+  korrin::SqlText sql;
   sql << "SELECT pageId, isFolder, parentId, pageNo FROM pages "
       << "WHERE isFolder = " << isFolder << " AND parentId = " << parentId
       << " ORDER BY pageNo ASC";
   Statement stmt(m_db, sql.str(), kPrepareLegacy);
   while (stmt.Step()) {
-    PagePtr page(new GamePageData);
+    PagePtr page = boost::make_shared<GamePageData>();
     page->pageId = stmt.Int(0);
     page->isFolder = stmt.Bool(1);
     page->parentId = stmt.Int(2);
     page->pageNo = stmt.Int(3);
-    pages.push_back(page);
+    pages.push_back(std::move(page));
   }
   return pages;
 }
 
 std::vector<BoxPtr> LauncherDataManager::GetBoxDataList(int pageId) {
   std::vector<BoxPtr> boxes;
-  std::stringstream sql;
+  korrin::SqlText sql;
   sql << "SELECT boxId, b.isFolder, b.pageId, col, row, appId, name, p.parentId, isPreload, "
          "isSystem, boxType, launchType, iconPath, content FROM boxes b, pages p ON p.pageId = "
          "b.pageId  WHERE b.pageId = "
       << pageId << " ORDER BY row, col";
   Statement stmt(m_db, sql.str(), kPrepareLegacy);
   while (stmt.Step()) {
-    BoxPtr box(new GameBoxData);
+    BoxPtr box = boost::make_shared<GameBoxData>();
     box->boxId = stmt.Int(0);
     int next = ReadBoxCommon(stmt, 1, box.get());
     ReadBoxKind(stmt, next, box.get());
-    boxes.push_back(box);
+    boxes.push_back(std::move(box));
   }
   return boxes;
 }
 
 std::vector<BoxPtr> LauncherDataManager::GetBoxDataListByAppId(std::string appId, int boxType) {
   std::vector<BoxPtr> boxes;
-  std::stringstream sql;
+  korrin::SqlText sql;
   sql << "SELECT boxId, b.isFolder, p.parentId, b.pageId, appId, name, col, row, isPreload, "
          "isSystem, boxType, launchType, iconPath, content "
       << "FROM boxes b, pages p ON p.pageId = b.pageId "
@@ -592,7 +594,7 @@ std::vector<BoxPtr> LauncherDataManager::GetBoxDataListByAppId(std::string appId
   }
   if (!stmt.BindText("$appId", appId)) KLOG(DLOG_ERROR, "Bind Err : %s\n", appId.c_str());
   while (stmt.Step()) {
-    BoxPtr box(new GameBoxData);
+    BoxPtr box = boost::make_shared<GameBoxData>();
     box->boxId = stmt.Int(0);
     box->isFolder = stmt.Bool(1);
     box->parentId = stmt.Int(2);
@@ -604,7 +606,7 @@ std::vector<BoxPtr> LauncherDataManager::GetBoxDataListByAppId(std::string appId
     box->isPreload = stmt.Bool(8);
     box->isSystem = stmt.Bool(9);
     ReadBoxKind(stmt, 10, box.get());
-    boxes.push_back(box);
+    boxes.push_back(std::move(box));
   }
   return boxes;
 }
@@ -615,7 +617,7 @@ std::vector<BoxPtr> LauncherDataManager::GetBoxDataListByAppId(std::string appId
 std::vector<BoxPtr> LauncherDataManager::GetBoxDataListByDownload(int parentId, bool) {
   std::vector<BoxPtr> boxes;
   // No ORDER BY: SQLite walks boxes by boxId, which is the order they were added.
-  std::stringstream sql;
+  korrin::SqlText sql;
   sql << "SELECT boxId, b.isFolder, appId, name "
       << "FROM boxes b, pages p ON p.pageId = b.pageId  "
       << "WHERE b.isFolder = 0 AND b.IsPreload = 0 AND b.boxType != " << kShortcutBoxType << " ";
@@ -624,7 +626,7 @@ std::vector<BoxPtr> LauncherDataManager::GetBoxDataListByDownload(int parentId, 
   int col = 1;
   int row = 1;
   while (stmt.Step()) {
-    BoxPtr box(new GameBoxData);
+    BoxPtr box = boost::make_shared<GameBoxData>();
     box->boxId = stmt.Int(0);
     box->isFolder = stmt.Bool(1);
     box->appId = stmt.Text(2);
@@ -633,7 +635,7 @@ std::vector<BoxPtr> LauncherDataManager::GetBoxDataListByDownload(int parentId, 
     box->col = col;
     box->row = row;
     box->parentId = parentId;
-    boxes.push_back(box);
+    boxes.push_back(std::move(box));
 
     if (++col > m_columns) {
       col = 1;
@@ -651,7 +653,7 @@ std::vector<PagePtr> LauncherDataManager::GetPageDataListByDownload(int parentId
   int boxCount = _GetPageDataCountByDownload(parentId);
   int pageCount = static_cast<int>(ceil(static_cast<double>(boxCount) / (m_maxRows * m_columns)));
   for (int k = 1; k <= pageCount; ++k) {
-    PagePtr page(new GamePageData);
+    PagePtr page = boost::make_shared<GamePageData>();
     page->pageId = kVirtualPageBase + k;
     page->isFolder = false;
     page->parentId = parentId;
@@ -772,7 +774,7 @@ namespace {
 
 // The boxes of one parent by name; ties keep SQLite's order.
 std::string AlphabeticalBoxesSql(int parentId, bool isFolder) {
-  std::stringstream sql;
+  korrin::SqlText sql;
   sql << "SELECT boxId, b.isFolder, appId, name, isPreload, isSystem, boxType, launchType, "
          "iconPath, content "
       << "FROM boxes b, pages p ON p.pageId = b.pageId "
@@ -782,7 +784,7 @@ std::string AlphabeticalBoxesSql(int parentId, bool isFolder) {
 }
 
 BoxPtr ReadAlphabeticalBox(const Statement& stmt) {
-  BoxPtr box(new GameBoxData);
+  BoxPtr box = boost::make_shared<GameBoxData>();
   box->boxId = stmt.Int(0);
   box->isFolder = stmt.Bool(1);
   box->appId = stmt.Text(2);
@@ -827,7 +829,7 @@ std::vector<BoxPtr> LauncherDataManager::GetBoxDataListByAlphabeticalOrder(int p
     box->pageId = AlphabeticalPageId(parentId, isFolder, cursor.page + 1);
     box->col = cursor.col;
     box->row = cursor.row;
-    boxes.push_back(box);
+    boxes.push_back(std::move(box));
     cursor.Advance();
   }
   return boxes;
@@ -838,7 +840,7 @@ std::vector<BoxPtr> LauncherDataManager::GetBoxDataListByAlphabeticalOrderWithRe
   // The stored pages of every parent with this id, menu or folder alike: the
   // launcher's statement does not look at isFolder.
   std::vector<int> pageIds;
-  std::stringstream pagesSql;
+  korrin::SqlText pagesSql;
   pagesSql << "SELECT pageId from Pages "
            << "WHERE parentId = " << parentId << " "
            << "Order By pageNo ASC ";
@@ -854,7 +856,7 @@ std::vector<BoxPtr> LauncherDataManager::GetBoxDataListByAlphabeticalOrderWithRe
     box->pageId = pageIds[cursor.page];
     box->col = cursor.col;
     box->row = cursor.row;
-    boxes.push_back(box);
+    boxes.push_back(std::move(box));
     cursor.Advance();
   }
   return boxes;
@@ -862,7 +864,7 @@ std::vector<BoxPtr> LauncherDataManager::GetBoxDataListByAlphabeticalOrderWithRe
 
 std::vector<PagePtr> LauncherDataManager::GetPageDataListByAlphabeticalOrder(int parentId,
                                                                             bool isFolder) {
-  std::stringstream sql;
+  korrin::SqlText sql;
   sql << "SELECT COUNT(*) "
       << "FROM boxes b, pages p ON p.pageId = b.pageId "
       << "WHERE p.isFolder = " << isFolder << " AND p.parentId = " << parentId;
@@ -880,7 +882,7 @@ std::vector<PagePtr> LauncherDataManager::GetPageDataListByAlphabeticalOrder(int
 
   std::vector<PagePtr> pages;
   for (int k = 1; k <= pageCount; ++k) {
-    PagePtr page(new GamePageData);
+    PagePtr page = boost::make_shared<GamePageData>();
     page->pageId = AlphabeticalPageId(parentId, isFolder, k);
     page->isFolder = isFolder;
     page->parentId = parentId;
@@ -939,7 +941,7 @@ int LauncherDataManager::UpdateBoxDataForAlphaBeticalOrder(GameBoxData& box) {
   }
 
   if (targetParent == oldPage->parentId) {
-    std::stringstream sql;
+    korrin::SqlText sql;
     sql << "UPDATE boxes set "
         << "name = $name "
         << " WHERE boxId = " << box.boxId;

@@ -34,6 +34,21 @@ std::string Statement::Text(int column) const {
                      static_cast<size_t>(sqlite3_column_bytes(m_stmt, column)));
 }
 
+SqlText& SqlText::operator<<(int value) {
+  // Digits from the right, as unsigned so that INT_MIN negates safely.
+  char digits[12];
+  char* end = digits + sizeof digits;
+  char* p = end;
+  unsigned magnitude = value < 0 ? 0u - static_cast<unsigned>(value) : static_cast<unsigned>(value);
+  do {
+    *--p = static_cast<char>('0' + magnitude % 10);
+    magnitude /= 10;
+  } while (magnitude != 0);
+  if (value < 0) *--p = '-';
+  m_text.append(p, end);
+  return *this;
+}
+
 bool ExecStatement(sqlite3* db, const std::string& sql, std::string* error) {
   char* message = NULL;
   int rc = sqlite3_exec(db, sql.c_str(), NULL, NULL, &message);

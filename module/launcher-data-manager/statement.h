@@ -50,6 +50,39 @@ class Statement {
   std::string m_error;
 };
 
+// Composes a statement's text exactly as std::ostream prints it by default:
+// ints in decimal, bools as 0 or 1. A stream's set-up alone (locale, buffers)
+// costs several thousand instructions, more than compiling a short statement.
+class SqlText {
+ public:
+  SqlText() { m_text.reserve(kTypicalLength); }
+
+  SqlText& operator<<(const char* text) {
+    m_text += text;
+    return *this;
+  }
+  SqlText& operator<<(const std::string& text) {
+    m_text += text;
+    return *this;
+  }
+  SqlText& operator<<(int value);
+  SqlText& operator<<(bool value) {
+    m_text += value ? '1' : '0';
+    return *this;
+  }
+
+  // A char would otherwise be taken for an int and printed as a number.
+  SqlText& operator<<(char) = delete;
+
+  const std::string& str() const { return m_text; }
+
+ private:
+  // The longest statement the store composes fits without growing.
+  static const size_t kTypicalLength = 320;
+
+  std::string m_text;
+};
+
 // Runs |sql| whole with sqlite3_exec, as deletions and transactions do.
 // Returns true on success; on failure stores SQLite's message in |*error|
 // when |error| is given. The message is freed either way.
