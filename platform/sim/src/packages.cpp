@@ -50,10 +50,49 @@ size_t PackageNamed(const std::string& pkgId) {
   return kNowhere;
 }
 
-// Before a change other than an append: the index is rebuilt when next asked.
+// Before a change the index does not follow: it is rebuilt when next asked.
 void Changing() {
   TheState().index.fresh = false;
   TheState().index.lent = false;
+}
+
+bool SameIds(const Package& a, const Package& b) {
+  if (a.id != b.id || a.apps.size() != b.apps.size()) return false;
+  for (size_t i = 0; i < a.apps.size(); ++i) {
+    if (a.apps[i].id != b.apps[i].id) return false;
+  }
+  return true;
+}
+
+// Takes the package at |p| out of a fresh index before it leaves the list, so
+// that an uninstall among thousands of packages does not cost a rebuild.
+void Unindex(State& state, size_t p) {
+  PackageIndex& index = state.index;
+  const std::vector<Package>& packages = state.packages;
+  index.packages.erase(packages[p].id);
+  std::vector<std::string> orphans;  // ids that may stand again further on
+  for (const App& app : packages[p].apps) {
+    auto found = index.apps.find(app.id);
+    if (found == index.apps.end() || found->second.first != p) continue;
+    index.apps.erase(found);
+    orphans.push_back(app.id);
+  }
+  for (auto& entry : index.packages) {
+    if (entry.second > p) --entry.second;
+  }
+  for (auto& entry : index.apps) {
+    if (entry.second.first > p) --entry.second.first;
+  }
+  for (const std::string& id : orphans) {
+    for (size_t q = p + 1; q < packages.size() && index.apps.count(id) == 0; ++q) {
+      for (size_t a = 0; a < packages[q].apps.size(); ++a) {
+        if (packages[q].apps[a].id == id) {
+          index.apps.emplace(id, std::make_pair(q - 1, a));
+          break;
+        }
+      }
+    }
+  }
 }
 
 // STARTED and PROCESSING, then |change| to the device, then COMPLETED.
@@ -121,7 +160,8 @@ void Device::AddPackage(const Package& pkg) {
   State& state = TheState();
   size_t p = PackageNamed(pkg.id);
   if (p != kNowhere) {
-    Changing();
+    // An update that keeps the ids, the usual one, leaves the index as it is.
+    if (!SameIds(state.packages[p], pkg)) Changing();
     state.packages[p] = pkg;
     return;
   }
@@ -142,8 +182,13 @@ void Device::AddApp(const std::string& appId, const std::string& label) {
 bool Device::RemovePackage(const std::string& pkgId) {
   size_t p = PackageNamed(pkgId);
   if (p == kNowhere) return false;
-  Changing();
-  TheState().packages.erase(TheState().packages.begin() + p);
+  State& state = TheState();
+  if (state.index.fresh && !state.index.lent) {
+    Unindex(state, p);
+  } else {
+    Changing();
+  }
+  state.packages.erase(state.packages.begin() + p);
   return true;
 }
 
