@@ -2,21 +2,27 @@
 // floor (call_log.h): the same statements, in the same order, with the same
 // commits, made straight through the C API. Each layout lives once on a disk
 // file and once on a memory file system, since on a phone's flash every
-// autocommit pays a sync. Prints one table: floor, store and their ratio.
+// autocommit pays a sync. Prints one table: floor, store, their ratio, and
+// per operation how both grow with the layout.
 //
 //   korrin-bench [--benchmark_filter=REGEX] [--benchmark_min_time=SECONDS]
 //   names read STORAGE/OPERATION/BOXES/floor|store
 //   KORRIN_BENCH_DISK_DIR (default /var/tmp) and KORRIN_BENCH_MEMORY_DIR
 //   (default /dev/shm) say where the two database files go.
+//   korrin-bench --callgrind [FILTER [MAX_BOXES]]: instruction counts instead,
+//   run under valgrind by bench/callgrind.sh.
 #include <benchmark/benchmark.h>
 #include <stdlib.h>
+#include <valgrind/callgrind.h>
 
+#include <cmath>
 #include <cstdio>
 #include <filesystem>
 #include <functional>
 #include <iostream>
 #include <map>
 #include <memory>
+#include <regex>
 #include <string>
 #include <vector>
 
@@ -248,6 +254,52 @@ void Register(Storage storage, int boxes, const Operation& op) {
   })->MinTime(minTime)->Unit(benchmark::kMicrosecond);
 }
 
+// Under callgrind (bench/callgrind.sh): each operation matching |filter| on
+// the memory layouts of at most |maxBoxes| boxes, floor then store, a warm-up
+// pass and then kCallgrindPasses counted passes each. Only the calls
+// themselves are collected; prepare and restore run with collection off. Each
+// side ends in a dump named STORAGE/OPERATION/BOXES/SIDE/PASSES that the
+// script turns into the table. Instruction counts do not depend on the
+// machine's load, so these figures compare across runs.
+const int kCallgrindPasses = 3;
+
+void RunUnderCallgrind(const std::string& filter, int maxBoxes) {
+  std::regex wanted(filter);
+  for (const Operation& op : Operations()) {
+    for (int boxes : kSizes) {
+      if (boxes > maxBoxes || boxes > op.maxBoxes[kMemory]) continue;
+      std::string name = std::string(kStorageNames[kMemory]) + "/" + op.name + "/" +
+                         std::to_string(boxes) + "/";
+      if (!std::regex_search(name, wanted)) continue;
+      Layout& layout = LayoutFor(kMemory, boxes);
+      bench::CallLog log;
+      if (op.prepare) op.prepare(layout);
+      bench::StartRecording(layout.store.m_db, &log);
+      op.run(layout);
+      bench::StopRecording();
+      if (op.restore) op.restore(layout);
+      const std::function<void()> sides[2] = {[&] { log.Replay(layout.store.m_db); },
+                                              [&] { op.run(layout); }};
+      const char* const sideNames[2] = {"floor", "store"};
+      for (int side = 0; side < 2; ++side) {
+        for (int pass = 0; pass <= kCallgrindPasses; ++pass) {
+          if (pass == 1) CALLGRIND_ZERO_STATS;  // pass 0 warms SQLite's caches
+          if (op.prepare) op.prepare(layout);
+          if (pass > 0) CALLGRIND_TOGGLE_COLLECT;
+          sides[side]();
+          if (pass > 0) CALLGRIND_TOGGLE_COLLECT;
+          if (op.restore) op.restore(layout);
+        }
+        // Named: the macro's statements outlive a temporary.
+        std::string dump = name + sideNames[side] + "/" + std::to_string(kCallgrindPasses);
+        CALLGRIND_DUMP_STATS_AT(dump.c_str());
+      }
+      std::cerr << "." << std::flush;
+    }
+  }
+  std::cerr << "\n";
+}
+
 // Keeps each run's time per iteration and prints them as one table at the end.
 class TableReporter : public benchmark::BenchmarkReporter {
  public:
@@ -265,18 +317,32 @@ class TableReporter : public benchmark::BenchmarkReporter {
       std::cerr << "." << std::flush;
     }
   }
+  // Rows come grouped by storage and operation, sizes ascending. The last row
+  // of each group also shows how floor and store grow: the slope of log(time)
+  // against log(boxes) from the group's first row (0 constant, 1 linear).
   void Finalize() override {
     std::cerr << "\n";
-    std::printf("%-7s %-35s %7s %12s %12s %7s\n", "storage", "operation", "boxes", "floor",
-                "store", "ratio");
-    for (const Row& row : m_rows) {
-      std::printf("%-7s %-35s %7s %12s %12s ", row.storage.c_str(), row.operation.c_str(),
+    std::printf("%-6s %-34s %6s %9s %9s %5s %6s %6s\n", "where", "operation", "boxes", "floor",
+                "store", "ratio", "floor~", "store~");
+    for (size_t i = 0; i < m_rows.size(); ++i) {
+      const Row& row = m_rows[i];
+      std::printf("%-6s %-34s %6s %9s %9s ", row.storage.c_str(), row.operation.c_str(),
                   row.boxes.c_str(), Time(row.floor).c_str(), Time(row.store).c_str());
       if (row.floor > 0 && row.store > 0) {
-        std::printf("%7.2f\n", row.store / row.floor);
+        std::printf("%5.2f", row.store / row.floor);
       } else {
-        std::printf("%7s\n", "-");
+        std::printf("%5s", "-");
       }
+      size_t first = i;
+      while (first > 0 && SameGroup(m_rows[first - 1], row)) --first;
+      bool lastOfGroup = i + 1 == m_rows.size() || !SameGroup(m_rows[i + 1], row);
+      if (lastOfGroup && first < i) {
+        const Row& small = m_rows[first];
+        double sizes = std::log(std::stod(row.boxes) / std::stod(small.boxes));
+        std::printf(" %6s %6s", Slope(small.floor, row.floor, sizes).c_str(),
+                    Slope(small.store, row.store, sizes).c_str());
+      }
+      std::printf("\n");
     }
   }
 
@@ -285,6 +351,15 @@ class TableReporter : public benchmark::BenchmarkReporter {
     std::string key, storage, operation, boxes;
     double floor = 0, store = 0;  // seconds per iteration
   };
+  static bool SameGroup(const Row& a, const Row& b) {
+    return a.storage == b.storage && a.operation == b.operation;
+  }
+  static std::string Slope(double from, double to, double logSizes) {
+    if (from <= 0 || to <= 0 || logSizes <= 0) return "-";
+    char text[16];
+    std::snprintf(text, sizeof text, "%.2f", std::log(to / from) / logSizes);
+    return text;
+  }
   Row& Find(const std::string& key) {
     for (Row& row : m_rows) {
       if (row.key == key) return row;
@@ -316,6 +391,12 @@ class TableReporter : public benchmark::BenchmarkReporter {
 }  // namespace
 
 int main(int argc, char** argv) {
+  // korrin-bench --callgrind [FILTER [MAX_BOXES]], run by bench/callgrind.sh.
+  if (argc > 1 && std::string(argv[1]) == "--callgrind") {
+    RunUnderCallgrind(argc > 2 ? argv[2] : "", argc > 3 ? atoi(argv[3]) : 10000);
+    g_layouts.clear();
+    return 0;
+  }
   benchmark::Initialize(&argc, argv);
   for (Storage storage : {kDisk, kMemory}) {
     for (const Operation& op : Operations()) {

@@ -6,6 +6,8 @@
 #   scripts/dev.sh bench [ARGS]
 #                             the benchmarks (a Release build of their own);
 #                             ARGS go to Google Benchmark
+#   scripts/dev.sh callgrind [FILTER [MAX_BOXES]]
+#                             instruction counts of the store and its floor
 #   scripts/dev.sh fuzz [SECONDS]
 #                             the fuzzer for SECONDS (default 600), keeping what it
 #                             finds in build-fuzz/work (or $KORRIN_FUZZ_WORK)
@@ -76,13 +78,18 @@ case "${1:-}" in
     run_tests build-sanitize
     ;;
   bench)
-    install_missing_packages libbenchmark-dev
+    install_missing_packages libbenchmark-dev valgrind
     build build-bench -DCMAKE_BUILD_TYPE=Release -DKORRIN_BENCHMARKS=ON -DKORRIN_TESTS=OFF
     # One table: each operation on a disk file and on /dev/shm (tmpfs), its
     # SQLite floor, the store, and store / floor. Extra arguments go to the
     # harness (--benchmark_filter=..., --benchmark_repetitions=N).
     shift
     build-bench/bench/korrin-bench "$@"
+    ;;
+  callgrind)
+    install_missing_packages libbenchmark-dev valgrind
+    shift
+    exec bash bench/callgrind.sh "$@"
     ;;
   fuzz)
     seconds=${2:-600}
@@ -102,7 +109,7 @@ case "${1:-}" in
     exit "$status"
     ;;
   *)
-    echo "usage: scripts/dev.sh demo|test|sanitize|bench|fuzz [SECONDS]" >&2
+    echo "usage: scripts/dev.sh demo|test|sanitize|bench|callgrind|fuzz [SECONDS]" >&2
     exit 2
     ;;
 esac
