@@ -16,17 +16,23 @@
 // card flags that a refresh clears. Re-running data_engin_initialization()
 // reopens the database, so one process serves every layout.
 //
-// Rows come out in store_bench.cpp's table as STORAGE/engine:OPERATION/BOXES.
+// Rows come out in store_bench.cpp's table as STORAGE/engine:OPERATION/BOXES,
+// and under `korrin-bench --callgrind` (bench/callgrind.sh) as instruction
+// counts, in memory only (RunEngineUnderCallgrind below).
 #include <benchmark/benchmark.h>
 #include <dlfcn.h>
 #include <sqlite3.h>
 #include <stdlib.h>
+#include <valgrind/callgrind.h>
 
+#include <algorithm>
 #include <cstdio>
 #include <filesystem>
 #include <functional>
+#include <iostream>
 #include <map>
 #include <memory>
+#include <regex>
 #include <string>
 #include <vector>
 
@@ -58,7 +64,8 @@ namespace {
 enum Storage { kDisk, kMemory };
 const char* const kStorageNames[] = {"disk", "memory"};
 
-const int kMenuBoxes = 10000;
+// The menu's size; under callgrind a smaller run may lay out 1,000 boxes.
+int g_menuBoxes = 10000;
 const int kPageBoxes = 1000;
 const int kCardApps = 100;
 const char kNewGame[] = "com.ex.newgame";
@@ -183,19 +190,22 @@ void RegisterFirstLaunch(Storage storage, int games) {
 }
 
 // ---- Package events and the boot signal in a 10,000-box menu: ten pages of
-// 1,000 boxes, game i at box i + 1.
+// 1,000 boxes, game i at box i + 1 (one page in a short callgrind run).
 
-const int kUninstalled = 4 * kPageBoxes + kPageBoxes / 2;  // mid-page: half the page moves up
-const int kUpdated = 7 * kPageBoxes + 123;
-const int kUninstalledPage = kUninstalled / kPageBoxes + 1;
+int MenuPages() { return g_menuBoxes / kPageBoxes; }
+// Mid-page, so that half the page moves up; on the fifth of ten pages.
+int Uninstalled() { return std::max(MenuPages() / 2 - 1, 0) * kPageBoxes + kPageBoxes / 2; }
+int UninstalledPage() { return Uninstalled() / kPageBoxes + 1; }
+int Updated() { return MenuPages() * 7 / 10 * kPageBoxes + 123; }
+std::string MenuKey() { return "menu" + std::to_string(g_menuBoxes); }
 
 void BuildMenu(Scene& scene) {
   data_engin_initialization();  // an empty device: the tables and menu "Apps"
-  std::string last = std::to_string(kMenuBoxes - 1);
+  std::string last = std::to_string(g_menuBoxes - 1);
   scene.Plain(
       "BEGIN;"
       "INSERT INTO Pages(isFolder, parentId, pageNo) WITH RECURSIVE n(i) AS (SELECT 1 UNION ALL "
-      "SELECT i + 1 FROM n WHERE i < " + std::to_string(kMenuBoxes / kPageBoxes) +
+      "SELECT i + 1 FROM n WHERE i < " + std::to_string(MenuPages()) +
       ") SELECT 0, 1, i FROM n;"
       "INSERT INTO Boxes(isFolder, pageId, appId, name, col, row, isPreload, isSystem, boxType, "
       "launchType) WITH RECURSIVE n(i) AS (SELECT 0 UNION ALL SELECT i + 1 FROM n WHERE i < " +
@@ -203,9 +213,9 @@ void BuildMenu(Scene& scene) {
       "'Game ' || i, i % " + std::to_string(kPageBoxes) + " % 4 + 1, i % " +
       std::to_string(kPageBoxes) + " / 4 + 1, 0, 0, 0, 0 FROM n;"
       "CREATE TABLE SavedPage AS SELECT * FROM Boxes WHERE pageId = " +
-      std::to_string(kUninstalledPage) + ";"
+      std::to_string(UninstalledPage()) + ";"
       "COMMIT;");
-  AddGames(kMenuBoxes);
+  AddGames(g_menuBoxes);
   Dev().SetPreference("memory/sysman/mmc", 1);
   Dev().ClearLogs();
 }
@@ -226,7 +236,7 @@ void Forget(const std::string& appId) {
 // them; a refresh replaces each record with an unflagged one.
 void FlagCardApps() {
   for (int n = 0; n < kCardApps; ++n) {
-    std::string id = GameId(n * (kMenuBoxes / kCardApps));
+    std::string id = GameId(n * (g_menuBoxes / kCardApps));
     boost::shared_ptr<GameBoxData>& cached = Tracker().m_appInfoCache[id];
     if (!cached) {
       boost::shared_ptr<GameBoxData> box(new GameBoxData);
@@ -239,7 +249,7 @@ void FlagCardApps() {
 }
 
 std::vector<Event> Events() {
-  std::string total = std::to_string(kMenuBoxes);
+  std::string total = std::to_string(g_menuBoxes);
   return {
       {"engine:Install",
        [] { Dev().Install(sim::MakePackage(kNewGame, {sim::GameApp(kNewGame, "New Game")})); },
@@ -251,21 +261,21 @@ std::vector<Event> Events() {
        }},
       {"engine:Update",
        [] {
-         Dev().Update(sim::MakePackage(GameId(kUpdated),
-                                       {sim::GameApp(GameId(kUpdated), GameLabel(kUpdated) + " HD")}));
+         std::string id = GameId(Updated());
+         Dev().Update(sim::MakePackage(id, {sim::GameApp(id, GameLabel(Updated()) + " HD")}));
        },
        [](const Scene& scene) {
-         scene.Plain("UPDATE Boxes SET name = '" + GameLabel(kUpdated) + "' WHERE appId = '" +
-                     GameId(kUpdated) + "';");
-         Forget(GameId(kUpdated));
+         scene.Plain("UPDATE Boxes SET name = '" + GameLabel(Updated()) + "' WHERE appId = '" +
+                     GameId(Updated()) + "';");
+         Forget(GameId(Updated()));
        }},
-      {"engine:Uninstall(1000-box page)", [] { Dev().Uninstall(GameId(kUninstalled)); },
+      {"engine:Uninstall(1000-box page)", [] { Dev().Uninstall(GameId(Uninstalled())); },
        [](const Scene& scene) {
          scene.Plain("BEGIN; DELETE FROM Boxes WHERE pageId = " +
-                     std::to_string(kUninstalledPage) +
+                     std::to_string(UninstalledPage()) +
                      "; INSERT INTO Boxes SELECT * FROM SavedPage; COMMIT;");
-         Dev().AddGame(GameId(kUninstalled), GameLabel(kUninstalled));
-         Forget(GameId(kUninstalled));
+         Dev().AddGame(GameId(Uninstalled()), GameLabel(Uninstalled()));
+         Forget(GameId(Uninstalled()));
        }},
       {"engine:BootDone(100 on card)",
        [] {
@@ -293,10 +303,10 @@ void Measure(benchmark::State& state, const Scene& scene, const Event& event, Bo
 
 void RegisterEvent(Storage storage, const Event& event) {
   std::string name = std::string(kStorageNames[storage]) + "/" + event.name + "/" +
-                     std::to_string(kMenuBoxes) + "/";
+                     std::to_string(g_menuBoxes) + "/";
   auto log = std::make_shared<bench::CallLog>();
   benchmark::RegisterBenchmark((name + "floor").c_str(), [=](benchmark::State& state) {
-    Scene& scene = Enter(storage, "menu", BuildMenu);
+    Scene& scene = Enter(storage, MenuKey(), BuildMenu);
     if (log->empty()) {
       if (event.prepare) event.prepare();
       bench::StartRecording(Store().m_db, log.get());
@@ -312,7 +322,7 @@ void RegisterEvent(Storage storage, const Event& event) {
   })->MinTime(0.05)->Unit(benchmark::kMicrosecond);
   benchmark::RegisterBenchmark((name + "store").c_str(), [=](benchmark::State& state) {
     log->Clear();
-    Scene& scene = Enter(storage, "menu", BuildMenu);
+    Scene& scene = Enter(storage, MenuKey(), BuildMenu);
     Measure(state, scene, event, [&] { event.run(); });
   })->MinTime(0.05)->Unit(benchmark::kMicrosecond);
 }
@@ -332,4 +342,82 @@ struct Registrar {
   }
 } g_registrar;
 
+// One side of a row under callgrind, as store_bench.cpp counts its own: a
+// warm-up pass, then |passes| passes with collection on around |call| alone,
+// and a dump named STORAGE/OPERATION/BOXES/SIDE/PASSES.
+void CountSide(const std::string& name, const char* side, int passes,
+               const std::function<void()>& prepare, const std::function<void()>& call,
+               const std::function<void()>& restore) {
+  for (int pass = 0; pass <= passes; ++pass) {
+    if (pass == 1) CALLGRIND_ZERO_STATS;
+    if (prepare) prepare();
+    if (pass > 0) CALLGRIND_TOGGLE_COLLECT;
+    call();
+    if (pass > 0) CALLGRIND_TOGGLE_COLLECT;
+    if (restore) restore();
+  }
+  std::string dump = name + side + "/" + std::to_string(passes);
+  CALLGRIND_DUMP_STATS_AT(dump.c_str());
+}
+
 }  // namespace
+
+namespace bench {
+
+// The engine rows under callgrind, in memory only. A first launch of N games
+// writes N boxes one commit at a time, about what the store's operations cost
+// on ten times the boxes, so launches go up to a tenth of |maxBoxes|. The
+// events run in the 10,000-box menu, or in a 1,000-box one (a single page)
+// when |maxBoxes| is below 10,000.
+void RunEngineUnderCallgrind(const std::string& filter, int maxBoxes, int passes) {
+  std::regex wanted(filter);
+  const Storage storage = kMemory;
+  const std::string prefix = std::string(kStorageNames[storage]) + "/";
+  for (int games : {100, 1000, 10000}) {
+    if (games > std::max(maxBoxes / 10, 100)) continue;
+    std::string name = prefix + "engine:FirstLaunch/" + std::to_string(games) + "/";
+    if (!std::regex_search(name, wanted)) continue;
+    Scene& scene = Enter(storage, "launch" + std::to_string(games), [games](Scene& s) {
+      AddGames(games);
+      data_engin_initialization();
+      Empty(s);
+    });
+    CallLog log;
+    Empty(scene);
+    g_recordNextOpen = &log;
+    data_engin_initialization();
+    StopRecording();
+    g_recordNextOpen = nullptr;
+    auto empty = [&] { Empty(scene); };
+    // The engine closes a connection and opens one; so does the floor. The
+    // path comes from the simulator, so it is found outside the count.
+    const std::string path = scene.DbPath();
+    CountSide(name, "floor", passes, empty, [&] {
+      sqlite3* db = NULL;
+      sqlite3_open(path.c_str(), &db);
+      log.Replay(db);
+      sqlite3_close(db);
+    }, nullptr);
+    CountSide(name, "store", passes, empty, [] { data_engin_initialization(); }, nullptr);
+    std::cerr << "." << std::flush;
+  }
+  g_menuBoxes = maxBoxes >= 10000 ? 10000 : 1000;
+  for (const Event& event : Events()) {
+    std::string name = prefix + event.name + "/" + std::to_string(g_menuBoxes) + "/";
+    if (!std::regex_search(name, wanted)) continue;
+    Scene& scene = Enter(storage, MenuKey(), BuildMenu);
+    CallLog log;
+    if (event.prepare) event.prepare();
+    StartRecording(Store().m_db, &log);
+    event.run();
+    StopRecording();
+    event.restore(scene);
+    auto restore = [&] { event.restore(scene); };
+    CountSide(name, "floor", passes, event.prepare, [&] { log.Replay(Store().m_db); }, restore);
+    CountSide(name, "store", passes, event.prepare, event.run, restore);
+    std::cerr << "." << std::flush;
+  }
+  g_menuBoxes = 10000;
+}
+
+}  // namespace bench

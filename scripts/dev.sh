@@ -7,7 +7,8 @@
 #                             the benchmarks (a Release build of their own);
 #                             ARGS go to Google Benchmark
 #   scripts/dev.sh callgrind [FILTER [MAX_BOXES]]
-#                             instruction counts of the store and its floor
+#                             instruction counts of the store, the engine path
+#                             and their floors, under callgrind
 #   scripts/dev.sh fuzz [SECONDS]
 #                             the fuzzer for SECONDS (default 600), keeping what it
 #                             finds in build-fuzz/work (or $KORRIN_FUZZ_WORK)
