@@ -126,31 +126,33 @@ using bench::Call;
 using bench::SlotOf;
 using bench::Watching;
 
+namespace {
+
+// Records a prepare of either kind on the watched connection; returns |rc|.
+// A -1 length reads to the terminator; the kept copy has one too.
+int Prepared(Call call, sqlite3* db, const char* sql, int length, sqlite3_stmt** stmt, int rc) {
+  if (Watching(db)) {
+    int slot = bench::g_log->m_slots++;
+    bench::g_slots[*stmt] = slot;
+    Add(call, slot, length, bench::Keep(sql, length));
+  }
+  return rc;
+}
+
+}  // namespace
+
 extern "C" {
 
 int sqlite3_prepare(sqlite3* db, const char* sql, int length, sqlite3_stmt** stmt,
                     const char** tail) {
   REAL(sqlite3_prepare);
-  int rc = real(db, sql, length, stmt, tail);
-  if (Watching(db)) {
-    int slot = bench::g_log->m_slots++;
-    bench::g_slots[*stmt] = slot;
-    Add(Call::kPrepare, slot, length, bench::Keep(sql, length));
-  }
-  return rc;
+  return Prepared(Call::kPrepare, db, sql, length, stmt, real(db, sql, length, stmt, tail));
 }
 
 int sqlite3_prepare_v2(sqlite3* db, const char* sql, int length, sqlite3_stmt** stmt,
                        const char** tail) {
   REAL(sqlite3_prepare_v2);
-  int rc = real(db, sql, length, stmt, tail);
-  if (Watching(db)) {
-    int slot = bench::g_log->m_slots++;
-    bench::g_slots[*stmt] = slot;
-    // A -1 length reads to the terminator; the kept copy has one too.
-    Add(Call::kPrepareV2, slot, length, bench::Keep(sql, length));
-  }
-  return rc;
+  return Prepared(Call::kPrepareV2, db, sql, length, stmt, real(db, sql, length, stmt, tail));
 }
 
 int sqlite3_bind_parameter_index(sqlite3_stmt* stmt, const char* name) {
