@@ -5,9 +5,10 @@
 #include <sys/wait.h>
 #include <unistd.h>
 
+#include <cstdio>
+#include <cstring>
 #include <filesystem>
 #include <fstream>
-#include <iostream>
 #include <random>
 
 #include "korrin-data/korrin-data.h"
@@ -17,94 +18,31 @@ namespace fs = std::filesystem;
 
 namespace {
 
-const unsigned kDefaultSeed = 20150601;
-
-// The first bytes of a rollback journal whose transaction has not ended; a
-// journal kept after its commit (journal mode PERSIST) starts with zeros.
-const unsigned char kJournalMagic[] = {0xd9, 0xd5, 0x05, 0xf9, 0x20, 0xa1, 0x63, 0xd7};
-
-bool StartsWithJournalMagic(const std::string& path) {
-  std::ifstream file(path, std::ios::binary);
-  char head[sizeof kJournalMagic] = {};
-  return file.read(head, sizeof head) &&
-         std::equal(head, head + sizeof head, reinterpret_cast<const char*>(kJournalMagic));
-}
+// The head of a rollback journal whose transaction has not ended; a journal
+// kept after its commit (PERSIST) starts with zeros.
+const char kJournalMagic[] = "\xd9\xd5\x05\xf9\x20\xa1\x63\xd7";
 
 long FromEnvironment(const char* name, long fallback) {
   const char* text = getenv(name);
   return text != nullptr && *text != '\0' ? strtol(text, nullptr, 10) : fallback;
 }
 
-void WriteAll(int fd, const std::string& text) {
-  for (size_t done = 0; done < text.size();) {
-    ssize_t n = write(fd, text.data() + done, text.size() - done);
-    if (n <= 0) return;
-    done += static_cast<size_t>(n);
-  }
-}
+long g_operations = 0;  // file operations the child made so far
 
-// File operations the child made so far.
-long g_operations = 0;
-
-void Die() {
-  kill(getpid(), SIGKILL);
-  abort();  // not reached
-}
-
-// Counts the file operations that change files and dies at |point|.
-//
-// Syncs are counted but not performed. A process killed with SIGKILL loses
-// nothing that already reached the kernel; what it cannot do is finish what it
-// had not started. Skipping fsync keeps that intact and lets thousands of
-// autocommits run in a fraction of a second.
+// Counts the operations that change files and dies at |point|. Syncs are
+// counted but skipped: SIGKILL loses nothing that reached the kernel, and
+// without fsync thousands of autocommits take a fraction of a second.
 void DieAt(KillPoint point) {
   g_operations = 0;
   int rc = fileshim::Install([point](fileshim::Op op, const std::function<int()>& perform) {
     if (op == fileshim::Op::kLock) return perform();
     long n = ++g_operations;
-    if (n == point.op && !point.afterIt) Die();
+    if (n == point.op && !point.afterIt) raise(SIGKILL);
     int result = op == fileshim::Op::kSync ? SQLITE_OK : perform();
-    if (n == point.op) Die();
+    if (n == point.op) raise(SIGKILL);
     return result;
   });
   if (rc != SQLITE_OK) abort();
-}
-
-// Runs |body| in a child process that dies at |point| and returns the child's
-// wait status; |report| gets what the body returned, when it did.
-int Fork(KillPoint point, const std::function<std::string()>& body, std::string* report) {
-  int pipeEnds[2];
-  if (pipe(pipeEnds) != 0) return -1;
-  pid_t pid = fork();
-  if (pid == 0) {
-    close(pipeEnds[0]);
-    DieAt(point);
-    WriteAll(pipeEnds[1], body());
-    // Not exit(): the test process's own objects are not the child's to end.
-    _exit(0);
-  }
-  close(pipeEnds[1]);
-  report->clear();
-  char buffer[4096];
-  for (ssize_t n; (n = read(pipeEnds[0], buffer, sizeof buffer)) > 0;) report->append(buffer, n);
-  close(pipeEnds[0]);
-  int status = -1;
-  if (pid < 0 || waitpid(pid, &status, 0) != pid) return -1;
-  return status;
-}
-
-std::string HowItEnded(int status) {
-  if (WIFSIGNALED(status)) return "killed by signal " + std::to_string(WTERMSIG(status));
-  if (WIFEXITED(status)) return "exited with status " + std::to_string(WEXITSTATUS(status));
-  return "lost (wait status " + std::to_string(status) + ")";
-}
-
-Lines SplitLines(const std::string& text) {
-  Lines lines;
-  for (size_t at = 0, end; (end = text.find('\n', at)) != std::string::npos; at = end + 1) {
-    lines.push_back(text.substr(at, end - at));
-  }
-  return lines;
 }
 
 }  // namespace
@@ -115,25 +53,37 @@ std::ostream& operator<<(std::ostream& out, const Kill& kill) {
              << kill.point.op << " of " << kill.operations;
 }
 
+// The child writes its operation count, then its logs, a line each, to a pipe.
 KilledTest::Run KilledTest::RunChild(KillPoint kill, const std::function<void()>& body) {
-  std::string report;
-  int status = Fork(
-      kill,
-      [&] {
-        device.ClearLogs();
-        body();
-        std::string text = std::to_string(g_operations) + "\n";
-        for (const std::string& line : EngineMessages()) text += line + "\n";
-        return text;
-      },
-      &report);
-  Run run = {WIFSIGNALED(status) && WTERMSIG(status) == SIGKILL, 0, SplitLines(report)};
-  if (!run.killed && (!WIFEXITED(status) || WEXITSTATUS(status) != 0 || run.logs.empty())) {
-    ADD_FAILURE() << "the child " << HowItEnded(status);
+  int ends[2];
+  if (pipe(ends) != 0) abort();
+  pid_t pid = fork();
+  if (pid == 0) {
+    close(ends[0]);
+    DieAt(kill);
+    device.ClearLogs();
+    body();
+    FILE* out = fdopen(ends[1], "w");
+    fprintf(out, "%ld\n", g_operations);
+    for (const std::string& line : EngineMessages()) fprintf(out, "%s\n", line.c_str());
+    fclose(out);
+    _exit(0);  // not exit(): the test process's objects are not the child's to end
   }
-  if (!run.logs.empty()) {
-    run.operations = std::stol(run.logs.front());
-    run.logs.erase(run.logs.begin());
+  close(ends[1]);
+  Run run = {false, 0, {}};
+  FILE* in = fdopen(ends[0], "r");
+  bool ended = fscanf(in, "%ld\n", &run.operations) == 1;
+  for (char line[4096]; fgets(line, sizeof line, in) != nullptr;) {
+    run.logs.emplace_back(line, strcspn(line, "\n"));
+  }
+  fclose(in);
+  int status = -1;
+  if (pid > 0) waitpid(pid, &status, 0);
+  run.killed = WIFSIGNALED(status) && WTERMSIG(status) == SIGKILL;
+  if (!run.killed && (!ended || !WIFEXITED(status) || WEXITSTATUS(status) != 0)) {
+    ADD_FAILURE() << "the child "
+                  << (WIFSIGNALED(status) ? "died of signal " : "exited with status ")
+                  << (WIFSIGNALED(status) ? WTERMSIG(status) : WEXITSTATUS(status));
   }
   return run;
 }
@@ -144,16 +94,19 @@ KilledTest::Run KilledTest::RunToTheEnd(const std::function<void()>& body) {
   return run;
 }
 
-Lines KilledTest::NextStart(const std::function<void()>& before) {
-  return RunToTheEnd([&] {
-           before();
-           data_engin_initialization();
-         })
-      .logs;
+Lines KilledTest::AddGames(int count) {
+  Lines ids;
+  char id[16];
+  for (int i = 1; i <= count; ++i) {
+    snprintf(id, sizeof id, "game%04d", i);
+    device.AddGame(id, id);
+    ids.push_back(id);
+  }
+  return ids;
 }
 
 std::vector<Kill> KilledTest::Plan(long first, long last, int count) {
-  unsigned seed = static_cast<unsigned>(FromEnvironment("KORRIN_KILL_SEED", kDefaultSeed));
+  unsigned seed = static_cast<unsigned>(FromEnvironment("KORRIN_KILL_SEED", 20150601));
   count = static_cast<int>(FromEnvironment("KORRIN_KILLS", count));
   std::mt19937 random(seed);
   std::vector<Kill> plan;
@@ -161,43 +114,38 @@ std::vector<Kill> KilledTest::Plan(long first, long last, int count) {
   for (int i = 0; i < count; ++i) {
     long from = first + span * i / count;
     long to = std::max(from, first + span * (i + 1) / count - 1);
-    Kill kill;
-    kill.point.op = std::uniform_int_distribution<long>(from, to)(random);
-    kill.point.afterIt = random() % 2 == 1;
-    kill.number = i + 1;
-    kill.of = count;
-    kill.seed = seed;
-    kill.operations = last;
-    plan.push_back(kill);
+    KillPoint point{std::uniform_int_distribution<long>(from, to)(random), random() % 2 == 1};
+    plan.push_back(Kill{point, i + 1, count, seed, last});
   }
   if (!plan.empty()) plan.back().point = {last, true};
   return plan;
 }
 
-Leftover KilledTest::WhatTheKillLeft() {
-  Leftover left;
-  left.hotJournal = StartsWithJournalMagic(JournalPath());
-  std::string copy = root + "/leftover.db";
+KilledTest::Aftermath KilledTest::KillAndRestart(KillPoint kill, const std::function<void()>& body,
+                                                 const std::function<void()>& before) {
+  EXPECT_TRUE(RunChild(kill, body).killed);
+  std::string journal = DbPath() + "-journal", copy = root + "/leftover.db";
+  char head[8] = {};
+  std::ifstream(journal, std::ios::binary).read(head, sizeof head);
+  hotJournals += std::equal(head, head + sizeof head, kJournalMagic);
   fs::remove(copy + "-journal");
   fs::copy_file(DbPath(), copy, fs::copy_options::overwrite_existing);
-  if (fs::exists(JournalPath())) fs::copy_file(JournalPath(), copy + "-journal");
-  SqlProbe db(copy);
-  left.integrity = db.Value("PRAGMA integrity_check");
-  // A kill while the schema was being made leaves tables missing; on the copy,
-  // make them so that they read as empty.
-  db.Exec(
+  if (fs::exists(journal)) fs::copy_file(journal, copy + "-journal");
+  Aftermath after;
+  SqlProbe leftover(copy);
+  EXPECT_EQ("ok", leftover.Value("PRAGMA integrity_check"));
+  // A kill while the schema was made leaves tables missing: make them empty.
+  leftover.Exec(
       "create table if not exists Menus(menuId, name, type);"
       "create table if not exists Pages(pageId, isFolder, parentId, pageNo);"
       "create table if not exists Boxes(boxId)");
-  left.layout = db.Layout();
-  return left;
-}
-
-void KilledTest::RemoveDatabase() {
-  fs::remove(DbPath());
-  fs::remove(JournalPath());
-}
-
-void KilledTest::Survived(int kills, const std::string& detail) {
-  std::cout << "[ survived ] " << kills << " kills: " << detail << std::endl;
+  after.left = leftover.Layout();
+  after.logs = RunToTheEnd([&] {
+                 before();
+                 data_engin_initialization();
+               }).logs;
+  SqlProbe db(DbPath());
+  EXPECT_EQ("ok", db.Value("PRAGMA integrity_check"));
+  after.layout = db.Layout();
+  return after;
 }
