@@ -1,13 +1,7 @@
-// The layout database file in a bad state: unreadable, read-only, on a full
-// disk, or not a database at all. The store logs what its messages name,
-// answers failure values, never crashes, and loses nothing: once the file is
-// fine again every earlier row is there.
-//
-// Root ignores file modes, so the mode tests give up root for a while (the
-// real and effective user ids, restored before the test ends) and are
-// skipped where that is not possible. The full-disk tests limit the size of
-// the files this process may write (RLIMIT_FSIZE, with SIGXFSZ ignored so
-// that a write fails instead of killing the process), as a full disk does.
+// The layout database file unreadable, read-only, on a full disk, or not a
+// database at all: the store logs, answers failure values and loses nothing.
+// The mode tests give up root for a while (skipped where they cannot); a full
+// disk is a file size limit, with SIGXFSZ ignored so that writes just fail.
 #include <dlog.h>
 #include <signal.h>
 #include <sys/resource.h>
@@ -26,22 +20,23 @@
 
 namespace {
 
-// The rest of the scope runs as user "nobody", as the launcher runs as a user
-// of its own on a device. Both the real and the effective user change, since
-// access() asks about the real one; the saved one stays root, so that root
-// comes back when the scope ends.
+// The rest of the scope runs as "nobody" (real and effective user, since
+// access() asks about the real one); the saved user stays root for the way back.
 class AsNobody {
  public:
   AsNobody() : m_dropped(geteuid() == 0 && setresuid(65534, 65534, 0) == 0) {}
   ~AsNobody() {
     if (m_dropped && setresuid(0, 0, 0) != 0) ADD_FAILURE() << "cannot become root again";
   }
-  // True when file modes now apply to this process.
   bool Active() const { return geteuid() != 0; }
 
  private:
   bool m_dropped;
 };
+
+#define AS_NOBODY()  \
+  AsNobody nobody;   \
+  if (!nobody.Active()) GTEST_SKIP() << "cannot give up root here (setresuid refused)"
 
 // The rest of the scope may write no file past |bytes|. Lift frees the disk.
 class FullDisk {
@@ -94,7 +89,15 @@ class BadFileTest : public SimTest {
         "launchType) VALUES(0, 1, 'a', 1, 1, 0, 0, 0, 0), (0, 1, 'b', 2, 1, 0, 0, 0, 0);");
     store._CloseDb();
     rows = SqlProbe(DbPath()).Layout();
+    bytes = Bytes(DbPath());
     device.ClearLogs();
+  }
+
+  // The file is writable again, unchanged byte for byte.
+  void ExpectFileUntouched() {
+    ASSERT_EQ(0, chmod(DbPath().c_str(), 0644));
+    EXPECT_EQ(bytes, Bytes(DbPath()));
+    ExpectRowsKept();
   }
 
   // Every row WriteRows wrote is there, and nothing else.
@@ -106,6 +109,7 @@ class BadFileTest : public SimTest {
   LauncherDataManager store;
   LauncherPackageManager packages;
   std::vector<Row> rows;
+  std::string bytes;
 };
 
 // The look-up by application id, as its failure line quotes it.
@@ -118,11 +122,9 @@ const char kByAppId[] =
 
 TEST_F(BadFileTest, UnreadableFileIsRefusedAndTheUnopenedStoreAnswersFailures) {
   WriteRows();
-  const std::string bytes = Bytes(DbPath());
   ASSERT_EQ(0, chmod(DbPath().c_str(), 0));
   {
-    AsNobody nobody;
-    if (!nobody.Active()) GTEST_SKIP() << "cannot give up root here (setresuid refused)";
+    AS_NOBODY();
     // The ids are listed and nothing is stored, yet first launch reports success.
     EXPECT_TRUE(store.Initialize(packages));
     EXPECT_EQ(nullptr, store.m_db);
@@ -157,20 +159,16 @@ TEST_F(BadFileTest, UnreadableFileIsRefusedAndTheUnopenedStoreAnswersFailures) {
                 "E Bind Err : a\n", "E cannot find box with appid[a]", "E sqlite error : "}),
             FromStore(EngineLogs()));
 
-  ASSERT_EQ(0, chmod(DbPath().c_str(), 0644));
-  EXPECT_EQ(bytes, Bytes(DbPath()));
-  ExpectRowsKept();
+  ExpectFileUntouched();
 }
 
 // ---- Read-only
 
 TEST_F(BadFileTest, ReadOnlyFileIsReadAndRefusesEveryWrite) {
   WriteRows();
-  const std::string bytes = Bytes(DbPath());
   ASSERT_EQ(0, chmod(DbPath().c_str(), 0444));
   {
-    AsNobody nobody;
-    if (!nobody.Active()) GTEST_SKIP() << "cannot give up root here (setresuid refused)";
+    AS_NOBODY();
     store._OpenDb();  // the tables exist: the schema writes nothing
     EXPECT_EQ(2u, store.GetBoxDataList(1).size());
     EXPECT_EQ(2, store.GetBoxDataByAppId("b")->boxId);
@@ -195,16 +193,13 @@ TEST_F(BadFileTest, ReadOnlyFileIsReadAndRefusesEveryWrite) {
   }
   EXPECT_EQ(std::vector<std::string>{"E sqlite error : attempt to write a readonly database"},
             FromStore(EngineLogs()));
-  ASSERT_EQ(0, chmod(DbPath().c_str(), 0644));
-  EXPECT_EQ(bytes, Bytes(DbPath()));
-  ExpectRowsKept();
+  ExpectFileUntouched();
 }
 
 TEST_F(BadFileTest, ReadOnlyEmptyFileLogsTheSchemaAndStaysEmpty) {
   std::ofstream(DbPath()) << "";
   ASSERT_EQ(0, chmod(DbPath().c_str(), 0444));
-  AsNobody nobody;
-  if (!nobody.Active()) GTEST_SKIP() << "cannot give up root here (setresuid refused)";
+  AS_NOBODY();
   EXPECT_TRUE(store.Initialize(packages));
   EXPECT_EQ(std::vector<std::string>{"E SQL error(8) : attempt to write a readonly database"},
             FromStore(EngineLogs()));

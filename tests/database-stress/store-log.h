@@ -12,11 +12,9 @@
 // The store's lines of |logs|, each as its priority letter and message.
 inline std::vector<std::string> FromStore(const std::vector<EngineLog>& logs) {
   std::vector<std::string> messages;
-  for (const EngineLog& log : logs) {
-    if (log.file == "launcher-data-manager.cpp") {
+  for (const EngineLog& log : logs)
+    if (log.file == "launcher-data-manager.cpp")
       messages.push_back((log.priority == DLOG_ERROR ? "E " : "? ") + log.message);
-    }
-  }
   return messages;
 }
 
