@@ -9,6 +9,8 @@
 #   scripts/dev.sh callgrind [FILTER [MAX_BOXES]]
 #                             instruction counts of the store, the engine path
 #                             and their floors, under callgrind
+#   scripts/dev.sh arm        the library, korrin-sim and the whole test suite
+#                             built for 32-bit ARM and run under qemu-user
 #   scripts/dev.sh fuzz [SECONDS]
 #                             the fuzzer for SECONDS (default 600), keeping what it
 #                             finds in build-fuzz/work (or $KORRIN_FUZZ_WORK)
@@ -58,6 +60,39 @@ build_fuzzer() {
   cmake --build build-fuzz -j"$(nproc)" --target korrin-fuzz
 }
 
+# The phone's architecture: Debian's cross compiler, and a sysroot of Debian's
+# own armhf packages unpacked into build-arm/sysroot with a private apt state,
+# so the machine's package architectures stay as they are.
+arm_packages=(g++-arm-linux-gnueabihf qemu-user googletest file)
+arm_sysroot_packages=(libsqlite3-0 libsqlite3-dev libboost1.74-dev libboost-program-options1.74.0
+                      libboost-program-options1.74-dev libedit2 libedit-dev libbsd0 libmd0 libtinfo6 libdtl-dev)
+arm_toolchain=(-DCMAKE_TOOLCHAIN_FILE="$PWD/cmake/arm-linux-gnueabihf.cmake"
+               -DKORRIN_ARM_SYSROOT="$PWD/build-arm/sysroot")
+
+prepare_arm_sysroot() {
+  local deps=build-arm/deps sysroot=build-arm/sysroot deb
+  [ -f "$sysroot/.complete" ] && return 0
+  rm -rf "$deps" "$sysroot"
+  mkdir -p "$deps/lists/partial" "$deps/cache/archives/partial" "$deps/debs"
+  touch "$deps/status"
+  local apt=(-q -o Dir::State::Lists="$PWD/$deps/lists" -o Dir::Cache="$PWD/$deps/cache"
+             -o Dir::State::status="$PWD/$deps/status" -o APT::Architecture=armhf
+             -o APT::Architectures::=armhf -o APT::Sandbox::User=root)
+  # An index that fails (a mirror mid-sync) is not fatal: the download below is.
+  apt-get "${apt[@]}" update >/dev/null || echo "dev.sh: some armhf indexes failed; going on" >&2
+  (cd "$deps/debs" && apt-get "${apt[@]}" download "${arm_sysroot_packages[@]}" >/dev/null)
+  for deb in "$deps"/debs/*.deb; do dpkg -x "$deb" "$sysroot"; done
+  # The cross compiler's loader, C and C++ libraries, where qemu-arm -L looks.
+  ln -s /usr/arm-linux-gnueabihf/lib/ld-linux-armhf.so.3 /usr/arm-linux-gnueabihf/lib/lib*.so.[0-9]* \
+    "$sysroot/lib/"
+  # GoogleTest from Debian's sources, built for the target into the sysroot.
+  cmake -S /usr/src/googletest -B "$deps/googletest" "${arm_toolchain[@]}" \
+    -DCMAKE_BUILD_TYPE=RelWithDebInfo -DCMAKE_INSTALL_PREFIX="$PWD/$sysroot/usr" >/dev/null
+  cmake --build "$deps/googletest" -j"$(nproc)" >/dev/null
+  cmake --install "$deps/googletest" >/dev/null
+  touch "$sysroot/.complete"
+}
+
 case "${1:-}" in
   demo)
     install_missing_packages
@@ -92,6 +127,14 @@ case "${1:-}" in
     shift
     exec bash bench/callgrind.sh "$@"
     ;;
+  arm)
+    install_missing_packages "${arm_packages[@]}"
+    prepare_arm_sysroot
+    build build-arm "${arm_toolchain[@]}"
+    file -L build-arm/libkorrin-data.so
+    qemu-arm -L build-arm/sysroot build-arm/tools/korrin-sim/korrin-sim demo
+    run_tests build-arm
+    ;;
   fuzz)
     seconds=${2:-600}
     install_missing_packages "${fuzz_packages[@]}"
@@ -110,7 +153,7 @@ case "${1:-}" in
     exit "$status"
     ;;
   *)
-    echo "usage: scripts/dev.sh demo|test|sanitize|bench|callgrind|fuzz [SECONDS]" >&2
+    echo "usage: scripts/dev.sh demo|test|sanitize|arm|bench|callgrind|fuzz [SECONDS]" >&2
     exit 2
     ;;
 esac

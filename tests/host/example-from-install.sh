@@ -7,6 +7,8 @@
 # usage: example-from-install.sh CMAKE BUILD_DIR LIBDIR CXX EXAMPLE [FLAG...]
 # The FLAGs are the ones the tree was built with (warnings, sanitizers): an
 # instrumented library loads only into an instrumented program.
+# In a cross build KORRIN_RUN (the emulator) starts the example and KORRIN_LDD
+# lists a library's dependencies.
 set -eu
 cmake=$1 build=$2 libdir=$3 cxx=$4 example=$5
 shift 5
@@ -31,14 +33,14 @@ installed=$(cd "$prefix/include/korrin-data" && find . -type f | sed 's|^\./||' 
 $installed"
 
 # The library finds the simulated platform beside it, without help.
-ldd "$prefix/$libdir/libkorrin-data.so" | grep -q "libkorrin-sim-platform.so => $prefix/$libdir/" ||
+${KORRIN_LDD:-ldd} "$prefix/$libdir/libkorrin-data.so" | grep -q "libkorrin-sim-platform.so => $prefix/$libdir/" ||
   fail "libkorrin-data.so does not find libkorrin-sim-platform.so beside it"
 
 export PKG_CONFIG_PATH="$prefix/$libdir/pkgconfig"
 "$cxx" -std=c++17 -Werror "$@" "$example" -o "$work/host" $(pkg-config --cflags --libs korrin-data)
 
 mkdir "$work/root"
-LD_LIBRARY_PATH="$prefix/$libdir" KORRIN_SIM_ROOT="$work/root" "$work/host" >"$work/out" ||
+LD_LIBRARY_PATH="$prefix/$libdir" KORRIN_SIM_ROOT="$work/root" ${KORRIN_RUN:-} "$work/host" >"$work/out" ||
   fail "the host exited with $?"
 cat "$work/out"
 

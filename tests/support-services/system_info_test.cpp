@@ -2,10 +2,29 @@
 // integer text. (The policy switch is seen through IsMDMRestriected.)
 #include <dlog.h>
 #include <system_info.h>
+#include <stdint.h>
+#include <stdlib.h>
 #include <time.h>
 
 #include "support/sim-test.h"
 #include "system-info/system-info.h"
+
+namespace {
+
+int64_t g_fakeNow = 0;  // seconds since the epoch, or 0 for the real clock
+
+}  // namespace
+
+// The clock the library reads. This binary exports it, so the library's call
+// binds here (on 32-bit ARM with 64-bit time the headers name it __time64,
+// and so does this definition).
+extern "C" time_t time(time_t* out) {
+  timespec now;
+  clock_gettime(CLOCK_REALTIME, &now);
+  time_t seconds = g_fakeNow != 0 ? static_cast<time_t>(g_fakeNow) : now.tv_sec;
+  if (out != NULL) *out = seconds;
+  return seconds;
+}
 
 namespace {
 
@@ -54,6 +73,15 @@ TEST_F(SystemInfoTest, DateIsTheLocalDayOfTheMonth) {
   int day = SystemInfo::GetCurrentDate();
   time_t after = time(NULL);
   EXPECT_TRUE(day == localtime(&before)->tm_mday || day == localtime(&after)->tm_mday);
+}
+
+// A 32-bit time_t ends in January 2038; the phone's build must see past it.
+TEST_F(SystemInfoTest, DateIsRightAfter2038) {
+  setenv("TZ", "UTC0", 1);
+  tzset();
+  g_fakeNow = 2214129600;  // 2040-02-29 12:00 UTC
+  EXPECT_EQ(29, SystemInfo::GetCurrentDate());
+  g_fakeNow = 0;
 }
 
 TEST_F(SystemInfoTest, IntegersBecomeSignedDecimalText) {
