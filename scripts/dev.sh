@@ -65,13 +65,17 @@ build_fuzzer() {
 # so the machine's package architectures stay as they are.
 arm_packages=(g++-arm-linux-gnueabihf qemu-user googletest file)
 arm_sysroot_packages=(libsqlite3-0 libsqlite3-dev libboost1.74-dev libboost-program-options1.74.0
-                      libboost-program-options1.74-dev libedit2 libedit-dev libbsd0 libmd0 libtinfo6 libdtl-dev)
+                      libboost-program-options1.74-dev libedit2 libedit-dev libbsd0 libmd0
+                      libtinfo6 libdtl-dev)
 arm_toolchain=(-DCMAKE_TOOLCHAIN_FILE="$PWD/cmake/arm-linux-gnueabihf.cmake"
                -DKORRIN_ARM_SYSROOT="$PWD/build-arm/sysroot")
 
 prepare_arm_sysroot() {
   local deps=build-arm/deps sysroot=build-arm/sysroot deb
-  [ -f "$sysroot/.complete" ] && return 0
+  # Made again when the package list or the toolchain file changes.
+  local made_from
+  made_from="${arm_sysroot_packages[*]} $(sha1sum cmake/arm-linux-gnueabihf.cmake)"
+  [ "$(cat "$sysroot/.made-from" 2>/dev/null)" = "$made_from" ] && return 0
   rm -rf "$deps" "$sysroot"
   mkdir -p "$deps/lists/partial" "$deps/cache/archives/partial" "$deps/debs"
   touch "$deps/status"
@@ -90,7 +94,7 @@ prepare_arm_sysroot() {
     -DCMAKE_BUILD_TYPE=RelWithDebInfo -DCMAKE_INSTALL_PREFIX="$PWD/$sysroot/usr" >/dev/null
   cmake --build "$deps/googletest" -j"$(nproc)" >/dev/null
   cmake --install "$deps/googletest" >/dev/null
-  touch "$sysroot/.complete"
+  echo "$made_from" >"$sysroot/.made-from"
 }
 
 case "${1:-}" in
