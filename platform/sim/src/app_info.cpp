@@ -29,11 +29,12 @@ int Open(const char* call, const char* appId, app_info_h* out) {
   return APP_MANAGER_ERROR_NONE;
 }
 
-template <typename Read>
-int GetText(const char* call, app_info_h info, char** out, Read read) {
+// |copy| copies the text straight from the handle into the caller's string.
+template <typename Copy>
+int GetText(const char* call, app_info_h info, char** out, Copy copy) {
   if (int error = sim::Enter(call)) return error;
   if (!Readable(info) || out == NULL) return APP_MANAGER_ERROR_INVALID_PARAMETER;
-  *out = sim::CopyText(read(*info));
+  *out = copy(*info);
   return APP_MANAGER_ERROR_NONE;
 }
 
@@ -79,14 +80,15 @@ bool Matches(const app_info_filter_s& filter, const sim::App& app) {
 
 // Calls |visit| with a lent handle on each application that |accept|s, in
 // installation order, until |visit| returns false. Works on a copy, so the
-// callback may change the device.
+// callback may change the device; each application is moved from the copy
+// into its handle rather than copied twice.
 template <typename Accept, typename Visit>
 void ForEachApp(Accept accept, Visit visit) {
   std::vector<sim::Package> packages = sim::TheState().packages;
-  for (const sim::Package& pkg : packages) {
-    for (const sim::App& app : pkg.apps) {
+  for (sim::Package& pkg : packages) {
+    for (sim::App& app : pkg.apps) {
       if (!accept(pkg, app)) continue;
-      app_info_s info = sim::AppInfoOf(pkg, app);
+      app_info_s info = sim::AppInfoOf(pkg, std::move(app));
       sim::Lent lent(&info, HandleKind::kLentAppInfo);
       if (!visit(&info)) return;
     }
@@ -121,27 +123,27 @@ int app_info_clone(app_info_h* clone, app_info_h app_info) {
 
 int app_info_get_app_id(app_info_h app_info, char** app_id) {
   return GetText("app_info_get_app_id", app_info, app_id,
-                 [](const app_info_s& info) { return info.app.id; });
+                 [](const app_info_s& info) { return sim::CopyText(info.app.id); });
 }
 
 int app_info_get_package(app_info_h app_info, char** package) {
   return GetText("app_info_get_package", app_info, package,
-                 [](const app_info_s& info) { return info.pkgId; });
+                 [](const app_info_s& info) { return sim::CopyText(info.pkgId); });
 }
 
 int app_info_get_icon(app_info_h app_info, char** path) {
   return GetText("app_info_get_icon", app_info, path,
-                 [](const app_info_s& info) { return info.app.icon; });
+                 [](const app_info_s& info) { return sim::CopyText(info.app.icon); });
 }
 
 int app_info_get_label(app_info_h app_info, char** label) {
   return GetText("app_info_get_label", app_info, label,
-                 [](const app_info_s& info) { return info.app.label; });
+                 [](const app_info_s& info) { return sim::CopyText(info.app.label); });
 }
 
 int app_info_get_type(app_info_h app_info, char** type) {
   return GetText("app_info_get_type", app_info, type,
-                 [](const app_info_s& info) { return info.app.type; });
+                 [](const app_info_s& info) { return sim::CopyText(info.app.type); });
 }
 
 int app_info_is_nodisplay(app_info_h app_info, bool* nodisplay) {

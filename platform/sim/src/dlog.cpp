@@ -6,6 +6,7 @@
 #include <unistd.h>
 
 #include <string>
+#include <utility>
 
 #include "state.h"
 
@@ -18,21 +19,31 @@ char PriorityLetter(int prio) {
 
 int Record(int prio, const char* tag, const char* fmt, va_list ap) {
   if (fmt == NULL) return DLOG_ERROR_INVALID_PARAMETER;
-  va_list measure;
-  va_copy(measure, ap);
-  int length = vsnprintf(NULL, 0, fmt, measure);
-  va_end(measure);
-  if (length < 0) return DLOG_ERROR_INVALID_PARAMETER;
-  std::string text(static_cast<size_t>(length) + 1, '\0');
-  vsnprintf(&text[0], text.size(), fmt, ap);
-  text.resize(static_cast<size_t>(length));
+  // Most lines fit the buffer and are formatted once; a longer one again, in full.
+  char buffer[512];
+  va_list retry;
+  va_copy(retry, ap);
+  int length = vsnprintf(buffer, sizeof buffer, fmt, ap);
+  if (length < 0) {
+    va_end(retry);
+    return DLOG_ERROR_INVALID_PARAMETER;
+  }
+  std::string text;
+  if (static_cast<size_t>(length) < sizeof buffer) {
+    text.assign(buffer, static_cast<size_t>(length));
+  } else {
+    text.assign(static_cast<size_t>(length) + 1, '\0');
+    vsnprintf(&text[0], text.size(), fmt, retry);
+    text.resize(static_cast<size_t>(length));
+  }
+  va_end(retry);
 
   sim::State& state = sim::TheState();
-  sim::LogLine line = {prio, tag != NULL ? tag : "", text};
-  state.logs.push_back(line);
+  state.logs.push_back(sim::LogLine{prio, tag != NULL ? tag : "", std::move(text)});
   if (state.echoLogs) {
+    const sim::LogLine& line = state.logs.back();
     fprintf(stderr, "%c/%s(%d): %s\n", PriorityLetter(prio), line.tag.c_str(),
-            static_cast<int>(getpid()), text.c_str());
+            static_cast<int>(getpid()), line.text.c_str());
   }
   return length;
 }

@@ -6,6 +6,8 @@
 
 #include <set>
 #include <stdexcept>
+#include <string_view>
+#include <unordered_map>
 
 #include "state.h"
 
@@ -48,45 +50,77 @@ const std::set<std::string>& CountedCalls() {
   return calls;
 }
 
-void RequireKnown(const std::set<std::string>& calls, const char* name) {
-  if (calls.count(name) == 0) {
+// A known call: where its count stands in State::callCounts, and which list
+// it is on.
+struct KnownCall {
+  size_t slot;
+  bool failable;
+};
+
+// Both lists by name, hashed, for the look-up every platform call makes on
+// entry: its C string name is viewed, not copied into a std::string.
+const std::unordered_map<std::string_view, KnownCall>& KnownCalls() {
+  static const std::unordered_map<std::string_view, KnownCall> known = [] {
+    std::unordered_map<std::string_view, KnownCall> calls;
+    for (const std::string& name : FailableCalls()) {
+      calls.emplace(name, KnownCall{calls.size(), true});
+    }
+    for (const std::string& name : CountedCalls()) {
+      calls.emplace(name, KnownCall{calls.size(), false});
+    }
+    return calls;
+  }();
+  return known;
+}
+
+// The count of |name|, a call on the list |failable| says, since the last Reset.
+int& CountOf(const char* name, bool failable) {
+  const std::unordered_map<std::string_view, KnownCall>& known = KnownCalls();
+  auto found = known.find(name);
+  if (found == known.end() || found->second.failable != failable) {
     fprintf(stderr, "sim: platform call '%s' is not in the simulator's list\n", name);
     abort();
   }
+  std::vector<int>& counts = TheState().callCounts;
+  if (counts.empty()) counts.resize(known.size());
+  return counts[found->second.slot];
+}
+
+// How often |call|, a known one, was made since the last Reset.
+int CountSoFar(const std::string& call) {
+  const std::vector<int>& counts = TheState().callCounts;
+  return counts.empty() ? 0 : counts[KnownCalls().at(call).slot];
 }
 
 }  // namespace
 
 int Enter(const char* name) {
-  RequireKnown(FailableCalls(), name);
+  int call = ++CountOf(name, true);
   State& state = TheState();
-  int call = ++state.callCounts[name];
-  std::map<std::string, std::function<void()>>::iterator before = state.beforeNext.find(name);
+  auto before = state.beforeNext.find(name);
   if (before != state.beforeNext.end()) {
     std::function<void()> action = std::move(before->second);
     state.beforeNext.erase(before);
     action();  // may make platform calls of its own
   }
-  std::map<std::string, int>::const_iterator always = state.alwaysFail.find(name);
+  auto always = state.alwaysFail.find(name);
   if (always != state.alwaysFail.end()) return always->second;
-  std::map<int, int>& pending = state.failAtCall[name];
-  std::map<int, int>::iterator once = pending.find(call);
-  if (once == pending.end()) return 0;
+  auto pending = state.failAtCall.find(name);
+  if (pending == state.failAtCall.end()) return 0;
+  std::map<int, int>::iterator once = pending->second.find(call);
+  if (once == pending->second.end()) return 0;
   int error = once->second;
-  pending.erase(once);
+  pending->second.erase(once);
   return error;
 }
 
-void Count(const char* name) {
-  RequireKnown(CountedCalls(), name);
-  ++TheState().callCounts[name];
-}
+void Count(const char* name) { ++CountOf(name, false); }
 
 void Device::FailNext(const std::string& call, int error, int skip) {
   if (FailableCalls().count(call) == 0) throw std::invalid_argument("cannot fail " + call);
   if (error == 0 || skip < 0) throw std::invalid_argument("a failure needs an error code");
   State& state = TheState();
-  state.failAtCall[call][state.callCounts[call] + skip + 1] = error;
+  state.failAtCall[call][CountSoFar(call) + skip + 1] = error;
 }
 
 void Device::FailAlways(const std::string& call, int error) {
@@ -109,8 +143,7 @@ int Device::CallCount(const std::string& call) const {
   if (FailableCalls().count(call) == 0 && CountedCalls().count(call) == 0) {
     throw std::invalid_argument("no platform call " + call);
   }
-  std::map<std::string, int>::const_iterator count = TheState().callCounts.find(call);
-  return count == TheState().callCounts.end() ? 0 : count->second;
+  return CountSoFar(call);
 }
 
 std::vector<std::string> Device::PlatformCalls() {

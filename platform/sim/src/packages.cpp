@@ -135,6 +135,11 @@ app_info_s AppInfoOf(const Package& pkg, const App& app) {
   return app_info_s{app, pkg.id, app.enabled && !pkg.disabled, pkg.preload};
 }
 
+app_info_s AppInfoOf(const Package& pkg, App&& app) {
+  bool enabled = app.enabled && !pkg.disabled;  // read before |app| is moved from
+  return app_info_s{std::move(app), pkg.id, enabled, pkg.preload};
+}
+
 App GameApp(const std::string& appId, const std::string& label) {
   App app = PlainApp(appId, label);
   app.game = true;

@@ -10,6 +10,7 @@
 #include <package_manager.h>
 #include <velmora_log_manager.h>
 
+#include <functional>
 #include <map>
 #include <optional>
 #include <string>
@@ -125,11 +126,16 @@ struct State {
   bool mdmReachable = true;
   std::map<std::string, mdm_status_t> mdmStates;
 
-  // Fault injection and call counts, by platform function name.
-  std::map<std::string, int> callCounts;
-  std::map<std::string, int> alwaysFail;                 // name -> error
-  std::map<std::string, std::map<int, int>> failAtCall;  // name -> call number -> error
-  std::map<std::string, std::function<void()>> beforeNext;  // name -> action, once
+  // Call counts, by the call's slot in the simulator's list (faults.cpp);
+  // empty until the first call.
+  std::vector<int> callCounts;
+  // Fault injection, by platform function name: std::less<> finds a call by
+  // its C string name without making a std::string of it.
+  template <typename Value>
+  using ByCall = std::map<std::string, Value, std::less<>>;
+  ByCall<int> alwaysFail;                      // name -> error
+  ByCall<std::map<int, int>> failAtCall;       // name -> call number -> error
+  ByCall<std::function<void()>> beforeNext;    // name -> action, once
 
   Held held;
 };
@@ -191,6 +197,8 @@ const Package* InstalledPackage(const std::string& pkgId);
 // The application and its package, or two nulls.
 std::pair<const Package*, const App*> InstalledApp(const std::string& appId);
 app_info_s AppInfoOf(const Package& pkg, const App& app);
+// The same, taking |app| over: for a copy the caller no longer needs.
+app_info_s AppInfoOf(const Package& pkg, App&& app);
 
 // Opens a package's information for package_info_create and
 // package_manager_get_package_info, which differ only in their name.
