@@ -22,9 +22,8 @@
 // handles held open are checked to be back where they were before the input.
 //
 // KORRIN_FUZZ_TRACE=1 prints every step with its arguments, to read a crashing
-// input. KORRIN_FUZZ_WRITE_SEEDS=DIR writes the seed corpus (kSeeds, below)
-// into DIR and exits; every seed is decoded again and must replay the same
-// steps.
+// input. The seed corpus in corpus/ is kept as bytes: one input per kind of
+// operation, grown by hand or from what a long run finds.
 #include <E_DBus.h>
 #include <app_control.h>
 #include <app_manager.h>
@@ -39,7 +38,6 @@
 
 #include <algorithm>
 #include <filesystem>
-#include <fstream>
 #include <functional>
 #include <map>
 #include <optional>
@@ -98,11 +96,6 @@ const size_t kMaxRaw = 512;     // bytes of one raw text
 const size_t kMaxLong = 65536;  // bytes of one repeated text
 const int kMaxSteps = 200;      // steps of one input
 
-template <class T, size_t N, class V>
-size_t IndexOf(const T (&list)[N], const V& value) {
-  return std::find(list, list + N, value) - list;
-}
-
 // |text| for a trace line: printable, and cut short.
 std::string Shown(const std::string& text) {
   std::string shown = "\"";
@@ -117,78 +110,52 @@ std::string Shown(const std::string& text) {
   return shown;
 }
 
-// ---- Arguments: read from the fuzzer's bytes, or, for the seed writer,
-// given as wanted values and written as the bytes that read back as them.
-
-// What a seed wants one argument to be: a number (for a text, an index into
-// kIds; for a nullable text, -1 is NULL), a text, or a piece repeated.
-struct Want {
-  Want(int value) : number(value), isText(false), length(0) {}
-  Want(const char* value) : number(0), text(value), isText(true), length(0) {}
-  static Want Repeated(const char* piece, int length) {
-    Want want(piece);
-    want.length = length;
-    return want;
-  }
-
-  int number;
-  std::string text;
-  bool isText;
-  int length;
-};
+// ---- Arguments, read from the fuzzer's bytes.
 
 class Input {
  public:
-  explicit Input(FuzzedDataProvider& data) : m_data(&data), m_next(0) {}
-  Input() : m_data(NULL), m_next(0) {}  // writes a seed
+  explicit Input(FuzzedDataProvider& data) : m_data(data) {}
 
-  bool More() const { return m_data != NULL && m_data->remaining_bytes() > 0; }
-  size_t Step(size_t count, size_t wanted) { return Pick(count, wanted); }
+  bool More() const { return m_data.remaining_bytes() > 0; }
+  size_t Step(size_t count) { return Pick(count); }
 
   unsigned Choose(unsigned n) {
-    unsigned value = Pick(n, m_data != NULL ? 0 : static_cast<unsigned>(Next().number) % n);
+    unsigned value = Pick(n);
     Note(std::to_string(value));
     return value;
   }
   bool Bool() { return Choose(2) == 1; }
 
   int Int() {
-    int wanted = m_data != NULL ? 0 : Next().number;
-    size_t special = IndexOf(kSpecialInts, wanted);
     const size_t kSpecials = sizeof kSpecialInts / sizeof kSpecialInts[0];
     int value;
-    switch (Pick(3, wanted >= 0 && wanted < 16 ? 0 : special < kSpecials ? 1 : 2)) {
-      case 0: value = static_cast<int>(Pick(16, wanted)); break;
-      case 1: value = kSpecialInts[Pick(kSpecials, special)]; break;
-      default: value = Word(wanted); break;
+    switch (Pick(3)) {
+      case 0: value = static_cast<int>(Pick(16)); break;
+      case 1: value = kSpecialInts[Pick(kSpecials)]; break;
+      default: value = m_data.ConsumeIntegral<int>(); break;
     }
     Note(std::to_string(value));
     return value;
   }
 
   std::string Text() {
-    Want want = m_data != NULL ? Want(0) : Next();
     const size_t kIdCount = sizeof kIds / sizeof kIds[0];
     const size_t kHostileCount = sizeof kHostile / sizeof kHostile[0];
-    size_t id =
-        want.isText ? IndexOf(kIds, want.text) : static_cast<size_t>(want.number) % kIdCount;
-    size_t hostile = IndexOf(kHostile, want.text);
     // 0-3: an id; 4: a hostile fragment; 5: raw bytes; 6: a piece repeated; 7: an id and raw bytes
-    unsigned kind = want.length > 0 ? 6 : id < kIdCount ? 0 : hostile < kHostileCount ? 4 : 5;
     std::string text;
-    switch (Pick(8, kind)) {
-      case 4: text = kHostile[Pick(kHostileCount, hostile)]; break;
-      case 5: text = Raw(kMaxRaw, want.text); break;
+    switch (Pick(8)) {
+      case 4: text = kHostile[Pick(kHostileCount)]; break;
+      case 5: text = Raw(kMaxRaw); break;
       case 6: {
-        std::string piece = Raw(16, want.text);
+        std::string piece = Raw(16);
         if (piece.empty()) piece = "x";
-        size_t length = 1 + static_cast<uint32_t>(Word(want.length - 1)) % kMaxLong;
+        size_t length = 1 + static_cast<uint32_t>(m_data.ConsumeIntegral<int>()) % kMaxLong;
         while (text.size() < length) text += piece;
         text.resize(length);
         break;
       }
-      case 7: text = std::string(kIds[Pick(kIdCount, 0)]) + Raw(kMaxRaw, ""); break;
-      default: text = kIds[Pick(kIdCount, id)]; break;
+      case 7: text = std::string(kIds[Pick(kIdCount)]) + Raw(kMaxRaw); break;
+      default: text = kIds[Pick(kIdCount)]; break;
     }
     Note(Shown(text));
     return text;
@@ -196,10 +163,7 @@ class Input {
 
   // A text, or NULL one time in eight; |storage| keeps the text.
   const char* NullableText(std::string& storage) {
-    bool wantNull = m_data == NULL && m_next < m_wants.size() && !m_wants[m_next].isText &&
-                    m_wants[m_next].number < 0;
-    if (wantNull) ++m_next;
-    if (Pick(8, wantNull ? 0 : 1) == 0) {
+    if (Pick(8) == 0) {
       Note("NULL");
       return NULL;
     }
@@ -209,25 +173,10 @@ class Input {
 
   template <size_t N>
   const char* OneOf(const char* const (&names)[N]) {
-    size_t wanted = 0;
-    if (m_data == NULL) {
-      Want want = Next();
-      wanted = want.isText ? IndexOf(names, want.text) : static_cast<size_t>(want.number);
-      if (wanted >= N) Die("a seed names an unknown choice " + want.text);
-    }
-    const char* name = names[Pick(N, wanted)];
+    const char* name = names[Pick(N)];
     Note(name);
     return name;
   }
-
-  // ---- Seed writing: the values the next step reads, in order; arguments
-  // past them take 0 (the first id, for a text).
-  void Expect(const std::vector<Want>& wants) {
-    m_wants = wants;
-    m_next = 0;
-  }
-  bool AllTaken() const { return m_next == m_wants.size(); }
-  std::string Encoded() const { return m_front + std::string(m_back.rbegin(), m_back.rend()); }
 
   static void Die(const std::string& message) {
     fprintf(stderr, "korrin-fuzz: %s\n", message.c_str());
@@ -237,41 +186,21 @@ class Input {
   std::string trace;  // the arguments of the current step, as read
 
  private:
-  Want Next() { return m_next < m_wants.size() ? m_wants[m_next++] : Want(0); }
   void Note(const std::string& text) { trace += " " + text; }
 
   // 0 to n - 1, from one byte at the end (n is at most 256).
-  unsigned Pick(size_t n, size_t wanted) {
+  unsigned Pick(size_t n) {
     if (n < 2) return 0;
-    if (m_data != NULL) return m_data->ConsumeIntegralInRange<unsigned>(0, n - 1);
-    m_back += static_cast<char>(wanted);
-    return static_cast<unsigned>(wanted);
-  }
-  // Any int, from four bytes at the end, the first taken the most significant.
-  int Word(int wanted) {
-    if (m_data != NULL) return m_data->ConsumeIntegral<int>();
-    uint32_t raw = static_cast<uint32_t>(wanted) ^ 0x80000000u;
-    for (int shift = 24; shift >= 0; shift -= 8) m_back += static_cast<char>(raw >> shift);
-    return wanted;
+    return m_data.ConsumeIntegralInRange<unsigned>(0, n - 1);
   }
   // Up to |max| bytes from the front, NULs dropped.
-  std::string Raw(size_t max, const std::string& wanted) {
-    if (m_data != NULL) {
-      std::string text = m_data->ConsumeRandomLengthString(max);
-      text.erase(std::remove(text.begin(), text.end(), '\0'), text.end());
-      return text;
-    }
-    if (wanted.size() > max || wanted.find('\0') != std::string::npos) Die("a seed text too long");
-    for (char c : wanted) m_front += c == '\\' ? std::string("\\\\") : std::string(1, c);
-    if (wanted.size() < max) m_front += "\\|";
-    return wanted;
+  std::string Raw(size_t max) {
+    std::string text = m_data.ConsumeRandomLengthString(max);
+    text.erase(std::remove(text.begin(), text.end(), '\0'), text.end());
+    return text;
   }
 
-  FuzzedDataProvider* m_data;  // null when writing a seed
-  std::vector<Want> m_wants;
-  size_t m_next;
-  std::string m_front;  // texts, in the order read
-  std::string m_back;   // choices and integers, in the order read
+  FuzzedDataProvider& m_data;
 };
 
 // ---- The harness's own state, outside the engine.
@@ -863,31 +792,19 @@ const Step kSteps[] = {
 const size_t kStepCount = sizeof kSteps / sizeof kSteps[0];
 static_assert(kStepCount <= 256, "a step is picked by one byte");
 
-size_t StepNamed(const std::string& name) {
-  for (size_t i = 0; i < kStepCount; ++i) {
-    if (name == kSteps[i].name) return i;
+// Runs the input's steps, printing each with its arguments when tracing.
+void RunSteps(Input& in) {
+  for (int steps = 0; in.More() && steps < kMaxSteps; ++steps) {
+    const Step& step = kSteps[in.Step(kStepCount)];
+    in.trace.clear();
+    try {
+      step.run(in);
+    } catch (const boost::bad_function_call&) {
+      in.trace += " -> bad_function_call";
+    }
+    Dev().ClearLogs();  // nobody reads them, and long texts make them big
+    if (g.tracing) fputs((step.name + in.trace + "\n").c_str(), stderr);
   }
-  Input::Die("no step " + name);
-  return 0;
-}
-
-// Runs one step; |wanted| names it when writing a seed. Appends its trace line to |log|.
-void RunStep(Input& in, size_t wanted, std::string* log) {
-  const Step& step = kSteps[in.Step(kStepCount, wanted)];
-  in.trace.clear();
-  try {
-    step.run(in);
-  } catch (const boost::bad_function_call&) {
-    in.trace += " -> bad_function_call";
-  }
-  Dev().ClearLogs();  // nobody reads them, and long texts make them big
-  std::string line = step.name + in.trace + "\n";
-  if (g.tracing) fputs(line.c_str(), stderr);
-  if (log != NULL) *log += line;
-}
-
-void RunSteps(Input& in, std::string* log) {
-  for (int steps = 0; in.More() && steps < kMaxSteps; ++steps) RunStep(in, 0, log);
 }
 
 // ---- Between inputs: put everything back, then check what must hold.
@@ -958,8 +875,6 @@ void RemoveRoot() {
   std::filesystem::remove_all(g.root, ignored);
 }
 
-void WriteSeeds(const std::string& dir);
-
 }  // namespace
 
 extern "C" int LLVMFuzzerInitialize(int*, char***) {
@@ -993,278 +908,13 @@ extern "C" int LLVMFuzzerInitialize(int*, char***) {
   }
   g.baselineHandles = Dev().OpenHandlesByKind();
   EndInput();
-
-  if (const char* dir = getenv("KORRIN_FUZZ_WRITE_SEEDS")) {
-    WriteSeeds(dir);
-    exit(0);
-  }
   return 0;
 }
 
 extern "C" int LLVMFuzzerTestOneInput(const uint8_t* bytes, size_t size) {
   FuzzedDataProvider data(bytes, size);
   Input in(data);
-  RunSteps(in, NULL);
+  RunSteps(in);
   EndInput();
   return 0;
 }
-
-// ---- The seed corpus: one story per kind of operation, written as the
-// steps and the argument values they read (texts given as numbers are ids of
-// kIds; arguments left out read as 0).
-
-namespace {
-
-typedef std::vector<std::pair<const char*, std::vector<Want> > > Story;
-
-struct Seed {
-  const char* file;
-  Story story;
-};
-
-// A game package as Pkg() reads it: id, flags, one application, its flags, label.
-std::vector<Want> Game(int id, const char* label, int appFlags = 0) {
-  return {id, 0, 0, id, appFlags, label};
-}
-
-const Seed kSeeds[] = {
-    {"first-launch",
-     {{"device.add", Game(0, "Racer")},
-      {"device.add", Game(1, "Chess")},
-      {"device.add", Game(3, "Tool", 1)},
-      {"device.add",
-       {2, 0, 1, "com.fz.pack.one", 0, "Pack One", "com.fz.pack.hidden", 2, "Hidden"}},
-      {"engine.start", {}},
-      {"store.GetMenuDataList", {}},
-      {"store.GetPageDataList", {1, 0}},
-      {"store.GetBoxDataList", {1}}}},
-    {"install",
-     {{"engine.start", {}},
-      {"device.install", Game(0, "Racer")},
-      {"device.install", Game(1, "Chess", 4)},
-      {"store.GetBoxDataByAppId", {0}}}},
-    {"update",
-     {{"device.add", Game(0, "Racer")},
-      {"engine.start", {}},
-      {"device.update", Game(0, "Racer Deluxe")},
-      {"device.update", Game(1, "Chess")},
-      {"device.update", Game(0, "Racer", 4)}}},
-    {"uninstall",
-     {{"device.add", Game(0, "Racer")},
-      {"device.add", Game(1, "Chess")},
-      {"engine.start", {}},
-      {"store.InsertBoxData", {0, 1, 0, 3, 1, 0, 3, 0, 0, "Racer shortcut", "/icon.png", "run"}},
-      {"device.uninstall", {0}},
-      {"device.uninstall", {3}}}},
-    {"raw-events",
-     {{"engine.start", {}},
-      {"device.add", Game(0, "Racer")},
-      {"device.event", {"tpk", 0, 0, 0, 0, 0}},
-      {"device.event", {"tpk", 0, 0, 1, 60, 0}},
-      {"device.event", {"tpk", 0, 0, 2, 100, 0}},
-      {"device.event", {"tpk", 1, 2, 0}},
-      {"device.event", {"tpk", 1, 2, 3, 0, -22}},
-      {"device.event", {"", "\xff", 9, 7, -1, 1}},
-      {"tracker._PkgMgrClientListenCb", {-1, -1, 1, 0}},
-      {"tracker.OnClientListenCb", {"tpk", 0, 0, 2}}}},
-    {"paused-jobs",
-     {{"engine.start", {}},
-      {"tracker.PauseListenCb", {}},
-      {"device.install", Game(0, "Racer")},
-      {"device.install", Game(1, "Chess")},
-      {"tracker.StartListenCb", {}},
-      {"tracker._DoPkgJob", {3, 0, 1, 0}}}},
-    {"storage-card",
-     {{"device.add", Game(0, "Racer")},
-      {"engine.start", {}},
-      {"tracker.GetAppInfo", {0}},
-      {"tracker.cached-record", {0, 1}},
-      {"device.card", {0, 1}},
-      {"tracker._RegisterEdbusSignalHandler", {}},
-      {"device.boot-done", {}},
-      {"tracker.OnMMCStatusChanged", {0}},
-      {"tracker._BootingDoneSignalCb", {1}}}},
-    {"policy",
-     {{"device.add", Game(0, "Racer")},
-      {"device.mdm", {0, 2, 0, 2, 1, 0}},
-      {"tracker.IsMDMAllowed", {0}},
-      {"tracker.IsMDMRestriected", {1}},
-      {"device.mdm", {1}},
-      {"tracker.IsMDMAllowed", {0}}}},
-    {"deactivated",
-     {{"device.add", {2, 24, 1, 2, 0, "Off One", "com.fz.pack.two", 0, "Off Two"}},
-      {"engine.start", {}},
-      {"tracker.LoadDeactivatedAppList", {}},
-      {"tracker._GetDeactivatedAppIds", {}},
-      {"tracker._GetDeactivatedAppInfo", {2}},
-      {"tracker._GetDeactivatedPkgInfo", {2}},
-      {"tracker._PkgMgrDeactivatedPackageInfoGetListCb", {2}},
-      {"tracker._PkgMgrDeactivatedAppInfoGetListCb", {0, 2}},
-      {"tracker._PkgMgrDeactivatedAppInfoGetCb", {2}},
-      {"tracker._PkgMgrDeactivatedPkgInfoGetCb", {2}},
-      {"store.InsertBoxDataForDeactivatedApp", {1, 2}},
-      {"store.DeleteBoxDataForDeactivatedApp", {1, 1}}}},
-    {"app-info",
-     {{"device.add", {0, 0, 0, 0, 64 + 128, "Racer", 0}},
-      {"device.add", Game(1, "Chess", 16)},
-      {"tracker.GetAppIdList", {1, 3}},
-      {"tracker.GetAppName", {0}},
-      {"tracker._GetAppInfo", {1}},
-      {"tracker._GetAppInfo(handle)", {0}},
-      {"tracker._GetAppIds", {0}},
-      {"tracker._IsMenuLaunch", {0}},
-      {"tracker._GetAllAppsInfoCb", {0}},
-      {"tracker._PkgMgrAppInfoGetListCb", {1, 0}},
-      {"tracker._has_mini_app_cb", {0}},
-      {"tracker._app_metadata_list_cb", {kMenuLaunchKey, APP_CONTROL_OPERATION_MAIN}}}},
-    {"menus",
-     {{"store.InsertMenuData", {0, "Apps", 0}},
-      {"store.InsertMenuData", {0, "'; DROP TABLE Menus; --", 2}},
-      {"store.GetMenuData", {2}},
-      {"store.UpdateMenuData", {2, "\xc3\xa9t\xc3\xa9 \xf0\x9f\x8e\xae", 1}},
-      {"store.GetMenuDataCount", {}},
-      {"store.GetMenuDataList", {}},
-      {"store.DeleteMenuData", {1}}}},
-    {"pages",
-     {{"store.InsertPageData", {0, 0, 1, 1}},
-      {"store.InsertPageData", {0, 0, 1, 2}},
-      {"store.UpdatePageData", {2, 0, 1, 3}},
-      {"store.GetMenuPageData", {2}},
-      {"store.GetPageDataCount", {1, 0}},
-      {"store.PageDataForAlphaBeticalOrder", {1}},
-      {"store.DeletePageData", {1}},
-      {"store.DeleteFolderPageData", {1}}}},
-    {"folders",
-     {{"store.InsertMenuData", {0, "Apps", 0}},
-      {"store.InsertPageData", {0, 0, 1, 1}},
-      {"store.InsertBoxData", {0, 1, 0, 1, 1, 1, 0, 0, 0, "Folder"}},
-      {"store.InsertPageData", {0, 1, 1, 1}},
-      {"store.InsertBoxData", {0, 2, 0, 3, 2, 0, 0, 0, 0}},
-      {"store.InsertBoxData", {0, 2, 0, 1, 1, 0, 0, 0, 1}},
-      {"store.InsertBoxData", {0, 1, 0, 4, 4, 0, 0, 0, 2}},
-      {"store.GetMenuBoxData", {1}},
-      {"store.UpdateBoxData", {2, 2, 0, 2, 2, 0, 0, 0, 0, "Racer"}},
-      {"store._ReorderData", {1, 0}},
-      {"store._ReorderData", {1, 1}},
-      {"store._ReorderDataWithoutSpace", {1, 0}},
-      {"store.RearrangeAppsPosition", {}},
-      {"store.GetBoxDataCount", {1}},
-      {"store.DeleteBoxData", {2}}}},
-    {"grid-limits",
-     {{"store.InsertPageData", {0, 0, 1, INT_MAX}},
-      {"store.InsertBoxData", {0, 1, 0, 4, 40000, 0, 0, 0, 0}},
-      {"store.InsertBoxData(appId)", {1}},
-      {"store.InsertBoxData", {0, 1, 0, 4, 0, 0, 0, 0, 2}},
-      {"store.InsertBoxDataForDeactivatedApp", {1, 3}},
-      {"store.GetBoxDataListByAlphabeticalOrder", {INT_MAX, 1}},
-      {"store._ReorderDataWithoutSpace", {1, 1}}}},
-    {"alphabetical",
-     {{"device.sample", {}},
-      {"engine.start", {}},
-      {"store.GetPageDataListByAlphabeticalOrder", {1, 0}},
-      {"store.GetBoxDataListByAlphabeticalOrder", {1, 0}},
-      {"store.GetBoxDataListByAlphabeticalOrderWithRealPage", {1, 0}},
-      {"store.InsertBoxDataForAlphaBeticalOrder", {0, 0, 0, 0, 0, 1, 0, 0, 0, "Zebra"}},
-      {"store.UpdateBoxDataForAlphaBeticalOrder", {3, 100001, 1, 0, 0, 0, 0, 0, 0, "Aardvark"}},
-      {"store.UpdateBoxDataForAlphaBeticalOrder", {4, 77, 9, 0, 0, 0, 0, 0, 0, "Moved"}},
-      {"store.DeleteBoxDataForAlphaBeticalOrder", {5}}}},
-    {"downloads",
-     {{"device.add", Game(0, "Racer")},
-      {"device.add", {1, 4, 0, 1, 0, "Preloaded Chess"}},
-      {"engine.start", {}},
-      {"store.InsertBoxData(appId)", {2}},
-      {"store.GetBoxDataListByDownload", {1, 0}},
-      {"store.GetPageDataListByDownload", {1, 0}},
-      {"store._GetPageDataCountByDownload", {1}},
-      {"store.GetBoxIdByAppId", {0}},
-      {"store.GetBoxDataListByAppId", {0, 0}}}},
-    {"hostile-text",
-     {{"device.add", Game(0, "'; DELETE FROM Boxes; --")},
-      {"engine.start", {}},
-      {"store.GetBoxDataByAppId", {"'; DROP TABLE Boxes; --"}},
-      {"store.InsertBoxData(appId)", {"\" OR 1=1 --"}},
-      {"store.InsertMenuData", {0, Want::Repeated("\xf0\x9f\x8e\xae'", 65536), 0}},
-      {"store.InsertBoxData(appId)", {Want::Repeated("$appId\\", 40000)}},
-      {"store.GetBoxDataListByAppId", {"\xed\xa0\x80", 3}},
-      {"tracker.GetAppInfo", {"%s%s%s%n"}}}},
-    {"faults",
-     {{"device.add", Game(0, "Racer")},
-      {"device.fail", {"app_info_get_label", -5, 0, 0}},
-      {"device.fail", {"package_info_create", -22, 1}},
-      {"engine.start", {}},
-      {"device.install", Game(1, "Chess")},
-      {"device.fail", {"e_dbus_init", -1, 0, 0}},
-      {"tracker._RegisterEdbusSignalHandler", {}},
-      {"device.fail", {"preference_get_int", -1, 1}},
-      {"device.boot-done", {}}}},
-    {"nested-events",
-     {{"device.add", Game(0, "Racer")},
-      {"device.before", {"app_info_get_label", 0, 1, 0, 0, 1, 0, "Chess"}},
-      {"engine.start", {}},
-      {"device.before", {"package_info_create", 2, 0}},
-      {"device.update", Game(1, "Chess II")}}},
-    {"locked-store",
-     {{"engine.start", {}},
-      {"device.lock", {}},
-      {"device.install", Game(0, "Racer")},
-      {"store.InsertMenuData", {0, "Locked", 0}},
-      {"store.RearrangeAppsPosition", {}},
-      {"device.lock", {}},
-      {"device.install", Game(1, "Chess")}}},
-    {"connection",
-     {{"store.BeginTransaction", {}},
-      {"store.InsertMenuData", {0, "Apps", 0}},
-      {"store.RollbackTransaction", {}},
-      {"store.BeginTransaction", {}},
-      {"store.CommitTransaction", {}},
-      {"store._CloseDb", {}},
-      {"store.GetMenuDataList", {}},
-      {"store.InsertBoxData(appId)", {0}},
-      {"store._OpenDb", {}},
-      {"store._CreateTables", {}},
-      {"store.Initialize", {}},
-      {"engine.db_util", {1}},
-      {"engine.stop", {}}}},
-    {"empty-callbacks",
-     {{"tracker.Initialize", {1}},
-      {"device.install", Game(0, "Racer")},
-      {"tracker.Terminate", {}},
-      {"tracker.UnregisterEdbusSignalHandler", {}}}},
-    {"services",
-     {{"service.InsertLog", {0, "launch", "extra", "1", 1}},
-      {"service.InsertLog", {-1, -1, -1, -1, 0}},
-      {"device.screen", {720, 1280}},
-      {"service.SystemInfo", {}},
-      {"service.to_string", {INT_MIN}},
-      {"service.to_string", {-1}}}},
-};
-
-void WriteSeeds(const std::string& dir) {
-  for (const Seed& seed : kSeeds) {
-    Input writer;
-    std::string written;
-    for (const auto& step : seed.story) {
-      writer.Expect(step.second);
-      RunStep(writer, StepNamed(step.first), &written);
-      if (!writer.AllTaken()) {
-        Input::Die(std::string(seed.file) + ": " + step.first + " reads fewer values");
-      }
-    }
-    EndInput();
-
-    std::string bytes = writer.Encoded();
-    FuzzedDataProvider data(reinterpret_cast<const uint8_t*>(bytes.data()), bytes.size());
-    Input reader(data);
-    std::string read;
-    RunSteps(reader, &read);
-    EndInput();
-    if (read != written) {
-      Input::Die(std::string(seed.file) + " reads back as\n" + read + "not\n" + written);
-    }
-
-    std::ofstream(dir + "/" + seed.file, std::ios::binary) << bytes;
-    printf("%-16s %5zu bytes, %zu steps\n", seed.file, bytes.size(), seed.story.size());
-  }
-}
-
-}  // namespace

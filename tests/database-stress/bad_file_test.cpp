@@ -100,7 +100,7 @@ class BadFileTest : public SimTest {
     ExpectRowsKept();
   }
 
-  // Every row WriteRows wrote is there, and nothing else.
+  // Every row of |rows| is there, and nothing else.
   void ExpectRowsKept() {
     EXPECT_EQ(rows, SqlProbe(DbPath()).Layout());
     EXPECT_EQ("ok", SqlProbe(DbPath()).Value("PRAGMA integrity_check"));
@@ -210,22 +210,18 @@ TEST_F(BadFileTest, ReadOnlyEmptyFileLogsTheSchemaAndStaysEmpty) {
 // as an I/O error (10) where ENOSPC would be SQLITE_FULL (13); the store
 // treats both alike.
 
-TEST_F(BadFileTest, FullDiskAtFirstLaunchWritesNothingAndTheNextStartPopulates) {
-  FullDisk disk(0);
+TEST_F(BadFileTest, FullDiskRefusesEveryWriteKeepsEveryRowAndWritesAgainOnceFreed) {
+  {
+    FullDisk disk(0);
+    EXPECT_TRUE(store.Initialize(packages));
+    EXPECT_EQ(0, SizeOf(DbPath()));
+  }
+  // Room again: the next start makes the whole first layout.
   EXPECT_TRUE(store.Initialize(packages));
-  EXPECT_EQ(std::vector<std::string>{"E SQL error(10) : disk I/O error"}, FromStore(EngineLogs()));
-  EXPECT_EQ(0, SizeOf(DbPath()));
-
-  disk.Lift();
-  EXPECT_TRUE(store.Initialize(packages));
+  rows = SqlProbe(DbPath()).Layout();
   EXPECT_EQ((std::vector<Row>{{"Apps", "com.ex.c"}}),
             SqlProbe(DbPath()).Rows("SELECT m.name, appId FROM Menus m, Pages p, Boxes b "
                                     "ON p.parentId = m.menuId AND b.pageId = p.pageId"));
-}
-
-TEST_F(BadFileTest, FullDiskRefusesWritesAndKeepsEveryRow) {
-  WriteRows();
-  store._OpenDb();
   GameBoxData shortcut;
   shortcut.pageId = 1;
   shortcut.boxType = 3;
@@ -236,7 +232,7 @@ TEST_F(BadFileTest, FullDiskRefusesWritesAndKeepsEveryRow) {
     // No room past what the file holds: an insert that needs more fails, it
     // answers the id the row would have had, and the file is cut back.
     FullDisk disk(size);
-    EXPECT_EQ(3, store.InsertBoxData(shortcut));
+    EXPECT_EQ(2, store.InsertBoxData(shortcut));
     EXPECT_EQ(size, SizeOf(DbPath()));
   }
   {
@@ -245,15 +241,17 @@ TEST_F(BadFileTest, FullDiskRefusesWritesAndKeepsEveryRow) {
     GameBoxData moved = *store.GetMenuBoxData(1);
     moved.col = 4;
     EXPECT_TRUE(store.UpdateBoxData(moved));
-    EXPECT_FALSE(store.DeleteBoxData(2));
+    EXPECT_FALSE(store.DeleteBoxData(1));
   }
-  EXPECT_EQ(std::vector<std::string>{"E sqlite error : disk I/O error"}, FromStore(EngineLogs()));
+  EXPECT_EQ((std::vector<std::string>{"E SQL error(10) : disk I/O error",
+                                      "E sqlite error : disk I/O error"}),
+            FromStore(EngineLogs()));
   ExpectRowsKept();
 
   // Room again: the same writes go through.
-  EXPECT_EQ(3, store.InsertBoxData(shortcut));
-  EXPECT_TRUE(store.DeleteBoxData(2));
-  EXPECT_EQ((std::vector<Row>{{"1", "a", "NULL"}, {"3", "c", "100000"}}),
+  EXPECT_EQ(2, store.InsertBoxData(shortcut));
+  EXPECT_TRUE(store.DeleteBoxData(1));
+  EXPECT_EQ((std::vector<Row>{{"2", "c", "100000"}}),
             SqlProbe(DbPath()).Rows("SELECT boxId, appId, length(content) FROM Boxes"));
 }
 

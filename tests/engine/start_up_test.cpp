@@ -21,34 +21,6 @@ class StartUpTest : public EngineTest {
   }
 };
 
-TEST_F(StartUpTest, FirstLaunchLaysOutTheSamplePhonesGamesFourToARow) {
-  device.LoadSampleDevice();
-  Start();
-
-  // The enabled, displayable games of the phone, by id.
-  Lines games;
-  for (const sim::Package& pkg : device.Packages()) {
-    for (const sim::App& app : pkg.apps) {
-      if (app.game && !app.noDisplay && app.enabled && !pkg.disabled) games.push_back(app.id);
-    }
-  }
-  std::sort(games.begin(), games.end());
-  ASSERT_EQ(33u, games.size());
-  Lines expected;
-  for (size_t i = 0; i < games.size(); ++i) {
-    expected.push_back(games[i] + " " + std::to_string(i % 4 + 1) + "," +
-                       std::to_string(i / 4 + 1));
-  }
-
-  EXPECT_EQ((std::vector<Row>{{"1", "Apps", "0"}}), db->Rows("SELECT * FROM Menus"));
-  EXPECT_EQ((std::vector<Row>{{"1", "0", "1", "1"}}), db->Rows("SELECT * FROM Pages"));
-  EXPECT_EQ(expected, Page(1));
-  // Only the id and the place: labels come from the platform each time.
-  EXPECT_EQ("0", db->Value("SELECT COUNT(*) FROM Boxes WHERE name IS NOT NULL"));
-  EXPECT_EQ(1, device.PackageListeners());
-  EXPECT_FALSE(packages.m_isListenPaused);
-}
-
 TEST_F(StartUpTest, AStartOnAPopulatedDatabaseWritesNothing) {
   AddGames({"Alpha", "Beta"});
   {

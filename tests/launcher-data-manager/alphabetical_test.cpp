@@ -106,8 +106,8 @@ TEST_F(AlphabeticalTest, RealPagesFollowTheStoredPagesAndStopAtTheLast) {
 
 // ---- Edits
 
-TEST_F(AlphabeticalTest, InsertStoresTheCallersBoxAtTheEndOfMenuOne) {
-  AddNamedBox(AddPage(1, 1), "x", 2, 3);
+TEST_F(AlphabeticalTest, InsertStoresTheCallersBoxAtTheEndOfMenuOneDeletePacksAndAnswersZero) {
+  int x = AddNamedBox(AddPage(1, 1), "x", 2, 3);
   GameBoxData shortcut;
   shortcut.boxType = 3;
   shortcut.appId = "com.ex.racer";
@@ -123,6 +123,11 @@ TEST_F(AlphabeticalTest, InsertStoresTheCallersBoxAtTheEndOfMenuOne) {
   EXPECT_EQ((std::vector<Row>{{"Race now", "/race.png", "race://now", "3"}}),
             db->Rows("SELECT name, iconPath, content, boxType FROM Boxes WHERE boxId = " +
                      std::to_string(id)));
+
+  EXPECT_EQ(0, store.DeleteBoxDataForAlphaBeticalOrder(x));
+  EXPECT_EQ("1/0 1:1,1", StoredPlace(id));
+  EXPECT_EQ("1", db->Value("SELECT count(*) FROM Boxes"));
+  EXPECT_TRUE(EngineLogs().empty());
 }
 
 TEST_F(AlphabeticalTest, DroppedOnItsOwnParentOnlyTheNameChanges) {
@@ -232,16 +237,6 @@ TEST_F(AlphabeticalTest, RefusedEditsAreLoggedAndAnswerZero) {
                  "No box [405]"},
                 {DLOG_ERROR, "launcher-data-manager.cpp", function, "invalid page parent id"}}),
             EngineLogs());
-}
-
-TEST_F(AlphabeticalTest, DeleteRemovesTheBoxPacksItsParentAndAnswersZero) {
-  int page = AddPage(20, 1, true);
-  int gone = AddNamedBox(page, "gone", 1, 1);
-  AddNamedBox(page, "left", 2, 1);
-  EXPECT_EQ(0, store.DeleteBoxDataForAlphaBeticalOrder(gone));
-  EXPECT_EQ("1,1", CellOf("id.left"));
-  EXPECT_EQ("1", db->Value("SELECT count(*) FROM Boxes"));
-  EXPECT_TRUE(EngineLogs().empty());
 }
 
 }  // namespace

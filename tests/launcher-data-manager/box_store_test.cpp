@@ -105,13 +105,21 @@ TEST_F(BoxStoreTest, UpdateUsesTheFormOfTheBox) {
   }
 }
 
-TEST_F(BoxStoreTest, GetMenuBoxDataReadsBackEveryStoredMemberAndTheParentThroughThePage) {
+// By box id every stored member and the parent through the page; by
+// application id placement, name and flags only.
+TEST_F(BoxStoreTest, ReadsByBoxIdGiveEveryStoredMemberAndByAppIdOnlyPlacementNameAndFlags) {
   GameBoxData box = Box(false, 3);
   store.InsertBoxData(box);
   box.parentId = 17;
   boost::shared_ptr<GameBoxData> read = store.GetMenuBoxData(box.boxId);
   EXPECT_EQ(Fields(box), Fields(*read));
   EXPECT_EQ("", read->pkgId);  // never stored
+
+  GameBoxData folder = Box(true, 0);
+  int id = store.InsertBoxData(folder);
+  EXPECT_EQ((Row{std::to_string(id), "1", std::to_string(page), "17", "2", "3", "com.ex.racer",
+                 "Racer", "1", "1", "0", "0", "", ""}),  // no type, launch type, icon, content
+            Fields(*store.GetBoxDataByAppId("com.ex.racer")));
 }
 
 // ---- Look-ups by application id
@@ -141,14 +149,6 @@ TEST_F(BoxStoreTest, LookUpsByAppIdFindTheBoxAsGivenButNeverAShortcut) {
   EXPECT_EQ((std::vector<EngineLog>{{DLOG_ERROR, "launcher-data-manager.cpp", "GetBoxDataByAppId",
                                      "cannot find box with appid[com.ex.racer]"}}),
             EngineLogs());
-}
-
-TEST_F(BoxStoreTest, GetBoxDataByAppIdReadsPlacementNameAndFlagsOnly) {
-  GameBoxData folder = Box(true, 0);
-  int id = store.InsertBoxData(folder);
-  EXPECT_EQ((Row{std::to_string(id), "1", std::to_string(page), "17", "2", "3", "com.ex.racer",
-                 "Racer", "1", "1", "0", "0", "", ""}),  // no type, launch type, icon, content
-            Fields(*store.GetBoxDataByAppId("com.ex.racer")));
 }
 
 }  // namespace

@@ -38,7 +38,7 @@ class DatabaseTest : public SimTest {
   LauncherDataManager store;
 };
 
-TEST_F(DatabaseTest, OpeningCreatesTheFileWithTheSchemaAndNothingElse) {
+TEST_F(DatabaseTest, OpeningCreatesTheSchemaAndNothingElseWithAPersistentJournal) {
   store._OpenDb();
   ASSERT_NE(nullptr, store.m_db);
   // AUTOINCREMENT keys make sqlite_sequence; there is no index and no trigger.
@@ -54,10 +54,7 @@ TEST_F(DatabaseTest, OpeningCreatesTheFileWithTheSchemaAndNothingElse) {
                 {"CREATE TABLE sqlite_sequence(name,seq)"}}),
             SqlProbe(DbPath()).Rows("SELECT sql FROM sqlite_master ORDER BY name"));
   EXPECT_TRUE(EngineLogs().empty());
-}
 
-TEST_F(DatabaseTest, JournalIsPersistent) {
-  store._OpenDb();
   std::string mode;
   sqlite3_exec(
       store.m_db, "PRAGMA journal_mode",
@@ -93,14 +90,7 @@ TEST_F(DatabaseTest, OpeningAgainKeepsEveryRowAndCloseReleasesTheConnection) {
   EXPECT_EQ(SQLITE_OK, store._CloseDb());
 }
 
-// ---- Locking
-
-TEST_F(DatabaseTest, BusyHandlerRetriesFiveTimesThenGivesUp) {
-  const int expected[] = {1, 1, 1, 1, 1, 0, 0};
-  for (int count = 0; count < 7; ++count) {
-    EXPECT_EQ(expected[count], db_util_busy_handler(NULL, count)) << "count " << count;
-  }
-}
+// ---- Locking (the retries themselves: database-stress/locked_test.cpp)
 
 TEST_F(DatabaseTest, WriteLockHeldElsewhereFailsWritesAtOnce) {
   store._OpenDb();

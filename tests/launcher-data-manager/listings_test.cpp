@@ -5,7 +5,7 @@ namespace {
 
 class ListingsTest : public StoreTest {};
 
-TEST_F(ListingsTest, PagesOfOneParentByPageNo) {
+TEST_F(ListingsTest, PagesOfOneParentByPageNoAndBoxesOfAPageByRowThenColumnWithEveryColumn) {
   EXPECT_TRUE(store.GetPageDataList(1, false).empty());
   AddPage(1, 3);  // page 1
   AddPage(1, 1);  // page 2
@@ -15,9 +15,7 @@ TEST_F(ListingsTest, PagesOfOneParentByPageNo) {
   EXPECT_EQ((std::vector<Row>{{"2", "0", "1", "1"}, {"3", "0", "1", "2"}, {"1", "0", "1", "3"}}),
             Fields(store.GetPageDataList(1, false)));
   EXPECT_EQ((std::vector<Row>{{"4", "1", "1", "1"}}), Fields(store.GetPageDataList(1, true)));
-}
 
-TEST_F(ListingsTest, BoxesOfAPageByRowThenColumnWithEveryColumn) {
   int page = AddPage(9, 1, true);
   AddBox(page, "b", 2, 1);
   AddBox(page, "c", 1, 2);

@@ -7,7 +7,9 @@ namespace {
 
 class MenuPageStoreTest : public StoreTest {};
 
-TEST_F(MenuPageStoreTest, MenuInsertWritesTheIdAndLeavesAnEmptyNameNull) {
+TEST_F(MenuPageStoreTest, MenusInsertWithTheirIdUpdateByIdFoundOrNotAndListNewestFirst) {
+  EXPECT_EQ(0, store.GetMenuDataCount());
+  EXPECT_TRUE(store.GetMenuDataList().empty());
   GameViewData apps, racing, unnamed;
   apps.name = "Apps";
   apps.type = 0;
@@ -20,46 +22,28 @@ TEST_F(MenuPageStoreTest, MenuInsertWritesTheIdAndLeavesAnEmptyNameNull) {
 
   EXPECT_EQ((std::vector<int>{1, 2, 3}),
             (std::vector<int>{apps.menuId, racing.menuId, unnamed.menuId}));
+  // An empty name is stored as NULL and read back as "".
   EXPECT_EQ((std::vector<Row>{{"1", "Apps", "0"}, {"2", "Racing", "7"}, {"3", "NULL", "-1"}}),
             db->Rows("SELECT menuId, name, type FROM Menus"));
   EXPECT_EQ((Row{"3", "", "-1"}), Fields(*store.GetMenuData(3)));
-}
-
-TEST_F(MenuPageStoreTest, MenuUpdateRewritesNameAndTypeByIdFoundOrNot) {
-  GameViewData menu;
-  menu.menuId = AddMenu("Apps");
-  menu.name = "Games";
-  menu.type = 2;
-  EXPECT_TRUE(store.UpdateMenuData(menu));
-  EXPECT_EQ((std::vector<Row>{{"Games", "2"}}), db->Rows("SELECT name, type FROM Menus"));
-
-  menu.name = "";
-  EXPECT_TRUE(store.UpdateMenuData(menu));
-  menu.menuId = 99;  // no such menu: still true, and nothing written
-  menu.name = "Nowhere";
-  EXPECT_TRUE(store.UpdateMenuData(menu));
-  EXPECT_EQ((std::vector<Row>{{"NULL", "2"}}), db->Rows("SELECT name, type FROM Menus"));
-}
-
-TEST_F(MenuPageStoreTest, MenusCountAndListNewestFirst) {
-  EXPECT_EQ(0, store.GetMenuDataCount());
-  EXPECT_TRUE(store.GetMenuDataList().empty());
-  AddMenu("one");
-  AddMenu("two");
-  db->Exec("INSERT INTO Menus(name, type) VALUES('three', 4)");
-
   EXPECT_EQ(3, store.GetMenuDataCount());
-  EXPECT_EQ((std::vector<Row>{{"3", "three", "4"}, {"2", "two", "0"}, {"1", "one", "0"}}),
+  EXPECT_EQ((std::vector<Row>{{"3", "", "-1"}, {"2", "Racing", "7"}, {"1", "Apps", "0"}}),
             Fields(store.GetMenuDataList()));
+
+  apps.name = "Games";
+  apps.type = 2;
+  EXPECT_TRUE(store.UpdateMenuData(apps));
+  EXPECT_EQ((std::vector<Row>{{"Games", "2"}}), db->Rows("SELECT name, type FROM Menus LIMIT 1"));
+  apps.name = "";
+  EXPECT_TRUE(store.UpdateMenuData(apps));
+  apps.menuId = 99;  // no such menu: still true, and nothing written
+  apps.name = "Nowhere";
+  EXPECT_TRUE(store.UpdateMenuData(apps));
+  EXPECT_EQ((std::vector<Row>{{"NULL", "2"}, {"Racing", "7"}, {"NULL", "-1"}}),
+            db->Rows("SELECT name, type FROM Menus"));
 }
 
-TEST_F(MenuPageStoreTest, GetMenuPageDataReadsOneOrGivesTheDefault) {
-  int id = AddPage(12, 2, true);
-  EXPECT_EQ((Row{std::to_string(id), "1", "12", "2"}), Fields(*store.GetMenuPageData(id)));
-  EXPECT_EQ(Fields(GamePageData()), Fields(*store.GetMenuPageData(id + 1)));
-}
-
-TEST_F(MenuPageStoreTest, PageDeletionsTakeTheirPagesAndLeaveTheBoxes) {
+TEST_F(MenuPageStoreTest, PagesReadOneOrTheDefaultAndDeletionsTakeTheirPagesAndLeaveTheBoxes) {
   int first = AddPage(1, 1);
   AddPage(1, 2);
   AddBox(first, "a", 1, 1);
@@ -67,11 +51,13 @@ TEST_F(MenuPageStoreTest, PageDeletionsTakeTheirPagesAndLeaveTheBoxes) {
   EXPECT_TRUE(store.DeletePageData(first));  // already gone: still true
   AddPage(5, 1, true);
   AddPage(5, 1, false);  // menu 5 shares the number, and goes too
-  AddPage(6, 1, true);
+  int kept = AddPage(6, 1, true);
   EXPECT_TRUE(store.DeleteFolderPageData(5));
   EXPECT_EQ((std::vector<Row>{{"1", "2"}, {"6", "1"}}),
             db->Rows("SELECT parentId, pageNo FROM Pages ORDER BY pageId"));
   EXPECT_EQ("1", db->Value("SELECT count(*) FROM Boxes"));
+  EXPECT_EQ((Row{std::to_string(kept), "1", "6", "1"}), Fields(*store.GetMenuPageData(kept)));
+  EXPECT_EQ(Fields(GamePageData()), Fields(*store.GetMenuPageData(first)));
 }
 
 TEST_F(MenuPageStoreTest, AlphabeticalPageFormsAnswerFixedValuesAndTouchNothing) {

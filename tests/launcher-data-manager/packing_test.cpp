@@ -28,7 +28,7 @@ class PackingTest : public StoreTest {
 
 // ---- Page by page
 
-TEST_F(PackingTest, ReorderPacksEachPageInPlaceAndRenumbersOrKeepsEmptyPagesWithoutBoxes) {
+TEST_F(PackingTest, ReorderPacksEachPageInPlaceAFolderThreeByThreeAndRenumbersOrKeepsEmptyPages) {
   int first = AddPage(1, 4);
   AddPage(1, 6);  // empty: goes
   int second = AddPage(1, 9);
@@ -37,22 +37,17 @@ TEST_F(PackingTest, ReorderPacksEachPageInPlaceAndRenumbersOrKeepsEmptyPagesWith
   AddBox(second, "c", 4, 4);
   int emptyFirst = AddPage(2, 5);
   int emptySecond = AddPage(2, 8);
+  int folderPage = AddPage(42, 1, true);
+  for (int i = 0; i < 10; ++i) AddBox(folderPage, "f" + std::to_string(i), i + 1, 7);
 
   store._ReorderData(1, false);
   store._ReorderData(2, false);
+  store._ReorderData(42, true);
 
   EXPECT_EQ((std::vector<std::string>{"a@1:1,1", "b@1:2,1", "c@2:1,1"}), Layout(1, false));
   EXPECT_EQ(std::to_string(first) + ":1 " + std::to_string(second) + ":2", PageNumbers(1, false));
   EXPECT_EQ(std::to_string(emptyFirst) + ":1 " + std::to_string(emptySecond) + ":2",
             PageNumbers(2, false));
-}
-
-TEST_F(PackingTest, ReorderLaysAFolderOutThreeByThree) {
-  int page = AddPage(42, 1, true);
-  for (int i = 0; i < 10; ++i) AddBox(page, "f" + std::to_string(i), i + 1, 7);
-
-  store._ReorderData(42, true);
-
   EXPECT_EQ((std::vector<std::string>{"f0@1:1,1", "f1@1:2,1", "f2@1:3,1", "f3@1:1,2", "f4@1:2,2",
                                       "f5@1:3,2", "f6@1:1,3", "f7@1:2,3", "f8@1:3,3",
                                       "f9@1:10,7"}),  // past the last row: keeps its cell
@@ -75,7 +70,7 @@ TEST_F(PackingTest, ReorderStopsAMenuPageAtRow40000) {
 
 // ---- Reflowed across pages
 
-TEST_F(PackingTest, ReorderWithoutSpaceUsesTheMenuGridForFoldersAndDropsEmptyPages) {
+TEST_F(PackingTest, ReorderWithoutSpaceUsesTheMenuGridFillsRowsUpTo40002AndDropsEmptyPages) {
   int page = AddPage(7, 1, true);
   for (int i = 0; i < 5; ++i) AddBox(page, "f" + std::to_string(i), 1, i + 1);
   AddPage(7, 2, true);
@@ -87,9 +82,8 @@ TEST_F(PackingTest, ReorderWithoutSpaceUsesTheMenuGridForFoldersAndDropsEmptyPag
   AddPage(3, 2);
   store._ReorderDataWithoutSpace(3, false);
   EXPECT_EQ("", PageNumbers(3, false));  // no box at all: every page goes
-}
 
-TEST_F(PackingTest, ReorderWithoutSpaceFillsRowsUpTo40002ThenTheNextPageOrLeavesTheRest) {
+  // Rows fill up to 40002, then the next page, or the rest stays put.
   int first = AddPage(1, 1);
   int second = AddPage(1, 2);
   FillPage(first, 160009);

@@ -133,7 +133,7 @@ TEST_F(AppInfoTest, EveryFailingCallIsLoggedAndReportedAsFalse) {
 
 // ---- The cache.
 
-TEST_F(AppInfoTest, SecondRequestIsAnsweredFromTheCache) {
+TEST_F(AppInfoTest, SecondRequestIsAnsweredFromTheCacheButGetAppNameAlwaysAsks) {
   boost::shared_ptr<GameBoxData> first = NewBox();
   ASSERT_TRUE(manager.GetAppInfo("com.ex.racer", first));
   first->isLocked = first->isOnStorageCard = first->isUpdatable = true;
@@ -160,6 +160,14 @@ TEST_F(AppInfoTest, SecondRequestIsAnsweredFromTheCache) {
   first->name = "Renamed by the launcher";
   ASSERT_TRUE(manager.GetAppInfo("com.ex.racer", second));
   EXPECT_EQ("Renamed by the launcher", second->name);
+
+  // GetAppName always asks the platform, and caches what it read.
+  device.FindApp("com.ex.racer")->label = "Racer 2";
+  boost::shared_ptr<GameBoxData> named = NewBox();
+  ASSERT_TRUE(manager.GetAppName("com.ex.racer", named));
+  EXPECT_EQ("Racer 2", named->name);
+  EXPECT_EQ(2, device.CallCount("app_info_create"));
+  EXPECT_EQ(named.get(), manager.m_appInfoCache["com.ex.racer"].get());
 }
 
 TEST_F(AppInfoTest, EntryWithoutNameOrIconIsDroppedAndReadAfresh) {
@@ -181,16 +189,6 @@ TEST_F(AppInfoTest, EntryWithoutNameOrIconIsDroppedAndReadAfresh) {
   device.FailNext("app_info_create", APP_MANAGER_ERROR_IO_ERROR);
   EXPECT_FALSE(manager.GetAppInfo("com.ex.racer", NewBox()));
   EXPECT_TRUE(manager.m_appInfoCache.empty());
-}
-
-TEST_F(AppInfoTest, GetAppNameAlwaysAsksThePlatform) {
-  ASSERT_TRUE(manager.GetAppInfo("com.ex.racer", NewBox()));
-  device.FindApp("com.ex.racer")->label = "Racer 2";
-  boost::shared_ptr<GameBoxData> box = NewBox();
-  ASSERT_TRUE(manager.GetAppName("com.ex.racer", box));
-  EXPECT_EQ("Racer 2", box->name);
-  EXPECT_EQ(2, device.CallCount("app_info_create"));
-  EXPECT_EQ(box.get(), manager.m_appInfoCache["com.ex.racer"].get());
 }
 
 }  // namespace

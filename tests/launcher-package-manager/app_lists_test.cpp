@@ -65,16 +65,7 @@ TEST_F(AppListsTest, ListsEnabledDisplayableGamesSortedWithTheCallersEntriesThen
   EXPECT_EQ(0, LeftOpen());
 }
 
-TEST_F(AppListsTest, GameTestFailureSkipsOnlyThatApplication) {
-  SetUpMixedDevice();
-  device.FailNext("app_info_is_game", APP_MANAGER_ERROR_IO_ERROR);  // com.ex.zebra
-  Ids ids;
-  ASSERT_TRUE(manager.GetAppIdList(ids));
-  EXPECT_EQ((Ids{"com.ex.apple", "com.ex.mango"}), ids);
-  EXPECT_EQ("E  app_info_is_game FAILED [-5] [0]", EngineMessages()[1]);
-}
-
-TEST_F(AppListsTest, ListingFailuresReturnFalseAndKeepTheCallersList) {
+TEST_F(AppListsTest, ListingFailuresReturnFalseAndKeepTheCallersListAGameTestFailureSkipsOne) {
   struct {
     const char* call;
     Ids logs;
@@ -96,11 +87,19 @@ TEST_F(AppListsTest, ListingFailuresReturnFalseAndKeepTheCallersList) {
     EXPECT_TRUE(manager.m_appInfoCache.empty());
     EXPECT_EQ(0, LeftOpen());
   }
+
+  // A failing game test skips only that application.
+  device.ClearLogs();
+  device.FailNext("app_info_is_game", APP_MANAGER_ERROR_IO_ERROR);  // com.ex.zebra
+  Ids ids;
+  ASSERT_TRUE(manager.GetAppIdList(ids));
+  EXPECT_EQ((Ids{"com.ex.apple", "com.ex.mango"}), ids);
+  EXPECT_EQ("E  app_info_is_game FAILED [-5] [0]", EngineMessages()[1]);
 }
 
 // ---- _GetAppIds
 
-TEST_F(AppListsTest, PackageListsItsDisplayableUiGames) {
+TEST_F(AppListsTest, PackageListsItsDisplayableUiGamesUpToTheFirstThatIsNoGame) {
   sim::App hidden = sim::GameApp("com.ex.pack.hidden", "Hidden");
   hidden.noDisplay = true;
   AddPack({sim::GameApp("com.ex.pack.a", "A"), hidden, Service("com.ex.pack.sync"),
@@ -113,9 +112,8 @@ TEST_F(AppListsTest, PackageListsItsDisplayableUiGames) {
                  "E ##### [com.ex.pack.b]", "E END"}),
             EngineMessages());
   EXPECT_EQ(0, LeftOpen());
-}
 
-TEST_F(AppListsTest, FirstApplicationThatIsNoGameEndsThePackagesList) {
+  // The first application that is no game ends the list.
   AddPack({sim::PlainApp("com.ex.pack.launcher", "Launcher"), sim::GameApp("com.ex.pack.a", "A")});
   EXPECT_EQ(Ids{}, manager._GetAppIds("com.ex.pack"));
   AddPack({sim::GameApp("com.ex.pack.a", "A"), sim::PlainApp("com.ex.pack.launcher", "Launcher"),

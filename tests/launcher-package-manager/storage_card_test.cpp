@@ -105,21 +105,19 @@ TEST_F(StorageCardTest, FailedSubscriptionKeepsNoBus) {
   }
 }
 
-TEST_F(StorageCardTest, ASecondSubscriptionKeepsTheFirst) {
+TEST_F(StorageCardTest, ASecondSubscriptionKeepsTheFirstAndUnregisterAloneStillShutsTheBusDown) {
+  manager.UnregisterEdbusSignalHandler();
+  EXPECT_EQ(1, device.CallCount("e_dbus_shutdown"));
+  EXPECT_EQ(0, device.CallCount("e_dbus_connection_close"));
+  EXPECT_EQ(0, device.CallCount("e_dbus_signal_handler_del"));
+  ExpectNoBus();
+
   ASSERT_TRUE(manager._RegisterEdbusSignalHandler());
   E_DBus_Signal_Handler* first = manager.m_bootSignalHandler;
   EXPECT_TRUE(manager._RegisterEdbusSignalHandler());
   EXPECT_EQ(first, manager.m_bootSignalHandler);
   EXPECT_EQ(1, device.BusSubscriptions());
   EXPECT_EQ(1, SendBootDone());
-  ExpectNoBus();
-}
-
-TEST_F(StorageCardTest, UnregisterWithNothingRegisteredStillShutsTheBusDown) {
-  manager.UnregisterEdbusSignalHandler();
-  EXPECT_EQ(1, device.CallCount("e_dbus_shutdown"));
-  EXPECT_EQ(0, device.CallCount("e_dbus_connection_close"));
-  EXPECT_EQ(0, device.CallCount("e_dbus_signal_handler_del"));
   ExpectNoBus();
 }
 
