@@ -89,11 +89,11 @@ awk '
       # Without the simulator: the store side less what ran for the device.
       own = (s[i] - sim[i]) / f[i]
       share = sim[i] > 0 ? sprintf("%5.1f%% %6.2f", 100 * sim[i] / s[i], own) : "     -      -"
-      printf "%-34s %7d %13.0f %13.0f %6.2f %s %s\n", op, n[i], f[i], s[i], s[i] / f[i], g, share
+      printf "%-34s %6d %11.0f %11.0f %6.2f %s %s\n", op, n[i], f[i], s[i], s[i] / f[i], g, share
     }
     rows = 0
   }
-  BEGIN { printf "%-34s %7s %13s %13s %6s %6s %6s %6s %6s\n", "operation", "boxes", "floor Ir", "store Ir", "ratio", "floor~", "store~", "sim", "-sim" }
+  BEGIN { printf "%-34s %6s %11s %11s %6s %6s %6s %6s %6s\n", "operation", "boxes", "floor Ir", "store Ir", "ratio", "floor~", "store~", "sim", "-sim" }
   {
     if ($2 != op || $3 != last) { if ($2 != op) flush(); op = $2; last = $3 }
     if ($4 == "floor") { rows++; n[rows] = $3; f[rows] = $6 / $5 } else { s[rows] = $6 / $5; sim[rows] = $7 / $5 }
