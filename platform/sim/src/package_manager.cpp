@@ -42,9 +42,13 @@ bool Matches(const package_manager_filter_s& filter, const sim::Package& pkg) {
 // installation order, until |visit| returns false.
 template <typename Visit>
 void ForEachPackage(const package_manager_filter_s& filter, Visit visit) {
-  std::vector<sim::Package> packages = sim::TheState().packages;  // callbacks may change them
-  for (const sim::Package& pkg : packages) {
-    if (!Matches(filter, pkg)) continue;
+  // A copy of the selected ones only: callbacks may change the device, and a
+  // filter mostly selects a few of many.
+  std::vector<sim::Package> selected;
+  for (const sim::Package& pkg : sim::TheState().packages) {
+    if (Matches(filter, pkg)) selected.push_back(pkg);
+  }
+  for (const sim::Package& pkg : selected) {
     package_info_s info{pkg};
     sim::Lent lent(&info, HandleKind::kLentPackageInfo);
     if (!visit(&info)) return;
