@@ -1,8 +1,8 @@
-# Cross build for the phone's architecture: 32-bit ARM, hard float, with
-# Debian's cross compiler. The C library comes with the compiler; everything
-# else (SQLite, Boost, libedit, GoogleTest) is looked up only in
-# KORRIN_ARM_SYSROOT, a build-local tree of Debian's own armhf packages
-# (see `scripts/dev.sh arm`). Tests and tools run under qemu-user.
+# Cross build for 32-bit ARM, hard float, with Debian's cross compiler. The C
+# library comes with the compiler; everything else (SQLite, Boost, libedit,
+# GoogleTest) is looked up only in KORRIN_ARM_SYSROOT, a build-local tree of
+# Debian's own armhf packages (see `scripts/dev.sh arm`). Tests and tools run
+# under qemu-user.
 set(CMAKE_SYSTEM_NAME Linux)
 set(CMAKE_SYSTEM_PROCESSOR arm)
 set(CMAKE_LIBRARY_ARCHITECTURE arm-linux-gnueabihf)
@@ -16,6 +16,7 @@ get_filename_component(KORRIN_ARM_SYSROOT ${KORRIN_ARM_SYSROOT} ABSOLUTE)
 list(APPEND CMAKE_TRY_COMPILE_PLATFORM_VARIABLES KORRIN_ARM_SYSROOT)
 set(KORRIN_ARM_LIBDIRS
   ${KORRIN_ARM_SYSROOT}/usr/lib/arm-linux-gnueabihf ${KORRIN_ARM_SYSROOT}/lib/arm-linux-gnueabihf)
+string(REPLACE ";" ":" KORRIN_ARM_LIBPATH "${KORRIN_ARM_LIBDIRS}")
 
 set(CMAKE_FIND_ROOT_PATH ${KORRIN_ARM_SYSROOT})
 set(CMAKE_FIND_ROOT_PATH_MODE_PROGRAM NEVER)
@@ -23,13 +24,24 @@ set(CMAKE_FIND_ROOT_PATH_MODE_LIBRARY ONLY)
 set(CMAKE_FIND_ROOT_PATH_MODE_INCLUDE ONLY)
 set(CMAKE_FIND_ROOT_PATH_MODE_PACKAGE ONLY)
 
-# pkg-config reads the sysroot's .pc files and prefixes their paths with it.
-set(ENV{PKG_CONFIG_LIBDIR}
-  ${KORRIN_ARM_SYSROOT}/usr/lib/arm-linux-gnueabihf/pkgconfig:${KORRIN_ARM_SYSROOT}/usr/share/pkgconfig)
+# pkg-config reads only the sysroot's .pc files and prefixes their paths with
+# it (PKG_CONFIG_PATH would be searched first: the host's stays out).
+set(ENV{PKG_CONFIG_LIBDIR} ${KORRIN_ARM_SYSROOT}/usr/lib/arm-linux-gnueabihf/pkgconfig)
+set(ENV{PKG_CONFIG_LIBDIR} $ENV{PKG_CONFIG_LIBDIR}:${KORRIN_ARM_SYSROOT}/usr/share/pkgconfig)
 set(ENV{PKG_CONFIG_SYSROOT_DIR} ${KORRIN_ARM_SYSROOT})
+set(ENV{PKG_CONFIG_PATH} "")
+
+# time_t is 32 bits on armhf unless asked for 64, and a 32-bit clock stops in
+# January 2038. Everything compiled here (GoogleTest and the tests' example
+# too) agrees on the width; Debian's armhf libraries keep 32 bits, but none of
+# their interfaces used here carries a time.
+set(KORRIN_ARM_TIME_FLAGS -D_FILE_OFFSET_BITS=64 -D_TIME_BITS=64)
+string(REPLACE ";" " " CMAKE_C_FLAGS_INIT "${KORRIN_ARM_TIME_FLAGS}")
+# GCC notes that passing some structures changed ABI in GCC 7.1; everything
+# here is built by one compiler, so the note says nothing about this build.
+set(CMAKE_CXX_FLAGS_INIT "${CMAKE_C_FLAGS_INIT} -Wno-psabi")
 
 # The sysroot's libraries need each other (libedit needs libbsd) at link time.
-string(REPLACE ";" ":" KORRIN_ARM_LIBPATH "${KORRIN_ARM_LIBDIRS}")
 set(CMAKE_EXE_LINKER_FLAGS_INIT "-Wl,-rpath-link,${KORRIN_ARM_LIBPATH}")
 set(CMAKE_SHARED_LINKER_FLAGS_INIT "-Wl,-rpath-link,${KORRIN_ARM_LIBPATH}")
 
@@ -39,14 +51,8 @@ set(CMAKE_CROSSCOMPILING_EMULATOR qemu-arm -L ${KORRIN_ARM_SYSROOT})
 
 # For the tests that build or inspect a program outside CMake: the flags that
 # find the sysroot's headers and libraries, its pkg-config files, and `ldd`.
-set(KORRIN_CROSS_FLAGS -isystem ${KORRIN_ARM_SYSROOT}/usr/include
+set(KORRIN_CROSS_FLAGS ${KORRIN_ARM_TIME_FLAGS} -isystem ${KORRIN_ARM_SYSROOT}/usr/include
   -L${KORRIN_ARM_SYSROOT}/usr/lib/arm-linux-gnueabihf -Wl,-rpath-link,${KORRIN_ARM_LIBPATH})
 set(KORRIN_CROSS_PKG_CONFIG_LIBDIR $ENV{PKG_CONFIG_LIBDIR})
-set(KORRIN_CROSS_LDD ${CMAKE_CROSSCOMPILING_EMULATOR} ${KORRIN_ARM_SYSROOT}/lib/ld-linux-armhf.so.3 --list)
-
-# time_t is 32 bits on armhf unless asked for 64, and a 32-bit clock stops in
-# January 2038. Everything built here (GoogleTest too) agrees on the width.
-set(CMAKE_C_FLAGS_INIT "-D_FILE_OFFSET_BITS=64 -D_TIME_BITS=64")
-# GCC notes that passing some structures changed ABI in GCC 7.1; everything
-# here is built by one compiler, so the note says nothing about this build.
-set(CMAKE_CXX_FLAGS_INIT "${CMAKE_C_FLAGS_INIT} -Wno-psabi")
+set(KORRIN_CROSS_LDD
+  ${CMAKE_CROSSCOMPILING_EMULATOR} ${KORRIN_ARM_SYSROOT}/lib/ld-linux-armhf.so.3 --list)

@@ -76,19 +76,24 @@ prepare_arm_sysroot() {
   local made_from
   made_from="${arm_sysroot_packages[*]} $(sha1sum cmake/arm-linux-gnueabihf.cmake)"
   [ "$(cat "$sysroot/.made-from" 2>/dev/null)" = "$made_from" ] && return 0
-  rm -rf "$deps" "$sysroot"
+  # The build's cache keeps the toolchain's flags of its first configuration.
+  rm -rf "$deps" "$sysroot" build-arm/CMakeCache.txt build-arm/CMakeFiles
   mkdir -p "$deps/lists/partial" "$deps/cache/archives/partial" "$deps/debs"
   touch "$deps/status"
   local apt=(-q -o Dir::State::Lists="$PWD/$deps/lists" -o Dir::Cache="$PWD/$deps/cache"
              -o Dir::State::status="$PWD/$deps/status" -o APT::Architecture=armhf
-             -o APT::Architectures::=armhf -o APT::Sandbox::User=root)
+             -o APT::Architectures::=armhf -o APT::Sandbox::User=root -o Acquire::Retries=3)
   # An index that fails (a mirror mid-sync) is not fatal: the download below is.
   apt-get "${apt[@]}" update >/dev/null || echo "dev.sh: some armhf indexes failed; going on" >&2
-  (cd "$deps/debs" && apt-get "${apt[@]}" download "${arm_sysroot_packages[@]}" >/dev/null)
+  (cd "$deps/debs" && apt-get "${apt[@]}" download "${arm_sysroot_packages[@]}" >/dev/null) || {
+    echo "dev.sh: cannot download Debian's armhf packages (do the apt sources offer armhf?)" >&2
+    exit 1
+  }
   for deb in "$deps"/debs/*.deb; do dpkg -x "$deb" "$sysroot"; done
   # The cross compiler's loader, C and C++ libraries, where qemu-arm -L looks.
-  ln -s /usr/arm-linux-gnueabihf/lib/ld-linux-armhf.so.3 /usr/arm-linux-gnueabihf/lib/lib*.so.[0-9]* \
-    "$sysroot/lib/"
+  mkdir -p "$sysroot/lib"
+  local cross=/usr/arm-linux-gnueabihf/lib
+  ln -s "$cross"/ld-linux-armhf.so.3 "$cross"/lib*.so.[0-9]* "$sysroot/lib/"
   # GoogleTest from Debian's sources, built for the target into the sysroot.
   cmake -S /usr/src/googletest -B "$deps/googletest" "${arm_toolchain[@]}" \
     -DCMAKE_BUILD_TYPE=RelWithDebInfo -DCMAKE_INSTALL_PREFIX="$PWD/$sysroot/usr" >/dev/null

@@ -7,6 +7,8 @@
 #include <dlfcn.h>
 #include <dlog.h>
 #include <poll.h>
+#include <signal.h>
+#include <sys/select.h>
 #include <sys/wait.h>
 #include <time.h>
 #include <unistd.h>
@@ -41,19 +43,36 @@ void Waited() {
 // linker binds the library's, SQLite's and libstdc++'s calls to these.
 // Nothing here needs to wait, so a sleep returns at once, counted while
 // catching; poll, which also serves file descriptors, is passed on when not
-// catching (its arguments hold no time_t, whose width differs between the
-// callers on 32-bit ARM). A seccomp filter would also see raw system calls,
-// but qemu-user, where the ARM build's tests run, refuses to install one.
+// catching (its arguments hold no time). Raw system calls are not seen: a
+// seccomp filter would see them, but qemu-user, where the ARM build's tests
+// run, refuses to install one.
 extern "C" {
 unsigned int sleep(unsigned int) { return Waited(), 0; }
 int usleep(useconds_t) { return Waited(), 0; }
 int nanosleep(const timespec*, timespec*) { return Waited(), 0; }
 int clock_nanosleep(clockid_t, int, const timespec*, timespec*) { return Waited(), 0; }
+int select(int, fd_set*, fd_set*, fd_set*, timeval*) { return Waited(), 0; }
+int pselect(int, fd_set*, fd_set*, fd_set*, const timespec*, const sigset_t*) {
+  return Waited(), 0;
+}
+int ppoll(pollfd*, nfds_t, const timespec*, const sigset_t*) { return Waited(), 0; }
 int poll(pollfd* fds, nfds_t n, int timeout) {
   if (g_catching) return Waited(), 0;
   typedef int (*Poll)(pollfd*, nfds_t, int);
   return reinterpret_cast<Poll>(dlsym(RTLD_NEXT, "poll"))(fds, n, timeout);
 }
+
+// With a 64-bit time_t on 32-bit ARM the headers give the definitions above
+// the names of the 64-bit versions; libraries built with a 32-bit time_t
+// still call the plain ones.
+#if defined(__USE_TIME_BITS64) && __TIMESIZE == 32
+int Nanosleep32(const void*, void*) __asm__("nanosleep");
+int Nanosleep32(const void*, void*) { return Waited(), 0; }
+int ClockNanosleep32(clockid_t, int, const void*, void*) __asm__("clock_nanosleep");
+int ClockNanosleep32(clockid_t, int, const void*, void*) { return Waited(), 0; }
+int Select32(int, fd_set*, fd_set*, fd_set*, void*) __asm__("select");
+int Select32(int, fd_set*, fd_set*, fd_set*, void*) { return Waited(), 0; }
+#endif
 }
 
 namespace {
