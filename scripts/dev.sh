@@ -36,7 +36,8 @@ install_missing_packages() {
     exit 1
   fi
   echo "dev.sh: installing ${missing[*]}" >&2
-  apt-get update -q
+  # A failed index (a mirror mid-sync) is not fatal: a failed install is.
+  apt-get update -q || echo "dev.sh: some package indexes failed; going on" >&2
   DEBIAN_FRONTEND=noninteractive apt-get install -y -q --no-install-recommends "${missing[@]}"
 }
 
