@@ -1,9 +1,8 @@
 # Plays lines-1-to-8.ksim, whose line 7 has a mistake, then checks with
 # check.ksim that the database holds what lines 1 to 6 made.
-# KORRIN_SIM is a command line (an emulator may come first).
-separate_arguments(korrin_sim UNIX_COMMAND "${KORRIN_SIM}")
+# KORRIN_SIM is a list: korrin-sim, after an emulator in a cross build.
 file(REMOVE_RECURSE ${ROOT})
-execute_process(COMMAND ${korrin_sim} run --root ${ROOT} ${SCRIPTS}/lines-1-to-8.ksim
+execute_process(COMMAND ${KORRIN_SIM} run --root ${ROOT} ${SCRIPTS}/lines-1-to-8.ksim
                 OUTPUT_QUIET ERROR_VARIABLE errors RESULT_VARIABLE status)
 if(status EQUAL 0)
   message(FATAL_ERROR "a script with a mistake ran to its end")
@@ -11,7 +10,7 @@ endif()
 if(NOT errors MATCHES "lines-1-to-8.ksim:7: ")
   message(FATAL_ERROR "the error does not name line 7:\n${errors}")
 endif()
-execute_process(COMMAND ${korrin_sim} run --root ${ROOT} ${SCRIPTS}/check.ksim
+execute_process(COMMAND ${KORRIN_SIM} run --root ${ROOT} ${SCRIPTS}/check.ksim
                 RESULT_VARIABLE status)
 if(NOT status EQUAL 0)
   message(FATAL_ERROR "the database is not what lines 1 to 6 made")
