@@ -29,12 +29,12 @@ int Open(const char* call, const char* appId, app_info_h* out) {
   return APP_MANAGER_ERROR_NONE;
 }
 
-// |copy| copies the text straight from the handle into the caller's string.
-template <typename Copy>
-int GetText(const char* call, app_info_h info, char** out, Copy copy) {
+// |read| names the handle's text; it is copied once, into the caller's string.
+template <typename Read>
+int GetText(const char* call, app_info_h info, char** out, Read read) {
   if (int error = sim::Enter(call)) return error;
   if (!Readable(info) || out == NULL) return APP_MANAGER_ERROR_INVALID_PARAMETER;
-  *out = copy(*info);
+  *out = sim::CopyText(read(*info));
   return APP_MANAGER_ERROR_NONE;
 }
 
@@ -123,27 +123,27 @@ int app_info_clone(app_info_h* clone, app_info_h app_info) {
 
 int app_info_get_app_id(app_info_h app_info, char** app_id) {
   return GetText("app_info_get_app_id", app_info, app_id,
-                 [](const app_info_s& info) { return sim::CopyText(info.app.id); });
+                 [](const app_info_s& info) -> const auto& { return info.app.id; });
 }
 
 int app_info_get_package(app_info_h app_info, char** package) {
   return GetText("app_info_get_package", app_info, package,
-                 [](const app_info_s& info) { return sim::CopyText(info.pkgId); });
+                 [](const app_info_s& info) -> const auto& { return info.pkgId; });
 }
 
 int app_info_get_icon(app_info_h app_info, char** path) {
   return GetText("app_info_get_icon", app_info, path,
-                 [](const app_info_s& info) { return sim::CopyText(info.app.icon); });
+                 [](const app_info_s& info) -> const auto& { return info.app.icon; });
 }
 
 int app_info_get_label(app_info_h app_info, char** label) {
   return GetText("app_info_get_label", app_info, label,
-                 [](const app_info_s& info) { return sim::CopyText(info.app.label); });
+                 [](const app_info_s& info) -> const auto& { return info.app.label; });
 }
 
 int app_info_get_type(app_info_h app_info, char** type) {
   return GetText("app_info_get_type", app_info, type,
-                 [](const app_info_s& info) { return sim::CopyText(info.app.type); });
+                 [](const app_info_s& info) -> const auto& { return info.app.type; });
 }
 
 int app_info_is_nodisplay(app_info_h app_info, bool* nodisplay) {

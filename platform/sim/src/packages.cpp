@@ -131,9 +131,7 @@ std::pair<const Package*, const App*> InstalledApp(const std::string& appId) {
   return std::pair<const Package*, const App*>(NULL, NULL);
 }
 
-app_info_s AppInfoOf(const Package& pkg, const App& app) {
-  return app_info_s{app, pkg.id, app.enabled && !pkg.disabled, pkg.preload};
-}
+app_info_s AppInfoOf(const Package& pkg, const App& app) { return AppInfoOf(pkg, App(app)); }
 
 app_info_s AppInfoOf(const Package& pkg, App&& app) {
   bool enabled = app.enabled && !pkg.disabled;  // read before |app| is moved from
