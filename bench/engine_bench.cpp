@@ -23,7 +23,6 @@
 #include <dlfcn.h>
 #include <sqlite3.h>
 #include <stdlib.h>
-#include <valgrind/callgrind.h>
 
 #include <algorithm>
 #include <cstdio>
@@ -36,6 +35,7 @@
 #include <string>
 #include <vector>
 
+#include "bench.h"
 #include "call_log.h"
 #include "korrin-data/korrin-data.h"
 #include "sim/device.h"
@@ -61,8 +61,10 @@ extern "C" int sqlite3_open(const char* path, sqlite3** db) {
 
 namespace {
 
-enum Storage { kDisk, kMemory };
-const char* const kStorageNames[] = {"disk", "memory"};
+using bench::kDisk;
+using bench::kMemory;
+using bench::kStorageNames;
+using bench::Storage;
 
 // The menu's size; under callgrind a smaller run may lay out 1,000 boxes.
 int g_menuBoxes = 10000;
@@ -90,11 +92,7 @@ void Exec(sqlite3* db, const std::string& sql) {
 class Scene {
  public:
   Scene(Storage storage, const std::string& name) {
-    const char* dir =
-        getenv(storage == kDisk ? "KORRIN_BENCH_DISK_DIR" : "KORRIN_BENCH_MEMORY_DIR");
-    std::string pattern = std::string(dir != NULL ? dir : storage == kDisk ? "/var/tmp" : "/dev/shm") +
-                          "/korrin-engine-bench-" + name + "-XXXXXX";
-    m_root = mkdtemp(&pattern[0]);
+    m_root = bench::MakeTempDir(storage, "korrin-engine-bench-" + name);
   }
   ~Scene() { std::filesystem::remove_all(m_root); }
 
@@ -342,23 +340,6 @@ struct Registrar {
   }
 } g_registrar;
 
-// One side of a row under callgrind, as store_bench.cpp counts its own: a
-// warm-up pass, then |passes| passes with collection on around |call| alone,
-// and a dump named STORAGE/OPERATION/BOXES/SIDE/PASSES.
-void CountSide(const std::string& name, const char* side, int passes,
-               const std::function<void()>& prepare, const std::function<void()>& call,
-               const std::function<void()>& restore) {
-  for (int pass = 0; pass <= passes; ++pass) {
-    if (pass == 1) CALLGRIND_ZERO_STATS;
-    if (prepare) prepare();
-    if (pass > 0) CALLGRIND_TOGGLE_COLLECT;
-    call();
-    if (pass > 0) CALLGRIND_TOGGLE_COLLECT;
-    if (restore) restore();
-  }
-  std::string dump = name + side + "/" + std::to_string(passes);
-  CALLGRIND_DUMP_STATS_AT(dump.c_str());
-}
 
 }  // namespace
 
@@ -392,13 +373,14 @@ void RunEngineUnderCallgrind(const std::string& filter, int maxBoxes, int passes
     // The engine closes a connection and opens one; so does the floor. The
     // path comes from the simulator, so it is found outside the count.
     const std::string path = scene.DbPath();
-    CountSide(name, "floor", passes, empty, [&] {
+    bench::CountUnderCallgrind(name, "floor", passes, empty, [&] {
       sqlite3* db = NULL;
       sqlite3_open(path.c_str(), &db);
       log.Replay(db);
       sqlite3_close(db);
     }, nullptr);
-    CountSide(name, "store", passes, empty, [] { data_engin_initialization(); }, nullptr);
+    bench::CountUnderCallgrind(name, "store", passes, empty, [] { data_engin_initialization(); },
+                               nullptr);
     std::cerr << "." << std::flush;
   }
   g_menuBoxes = maxBoxes >= 10000 ? 10000 : 1000;
@@ -413,8 +395,9 @@ void RunEngineUnderCallgrind(const std::string& filter, int maxBoxes, int passes
     StopRecording();
     event.restore(scene);
     auto restore = [&] { event.restore(scene); };
-    CountSide(name, "floor", passes, event.prepare, [&] { log.Replay(Store().m_db); }, restore);
-    CountSide(name, "store", passes, event.prepare, event.run, restore);
+    bench::CountUnderCallgrind(name, "floor", passes, event.prepare,
+                               [&] { log.Replay(Store().m_db); }, restore);
+    bench::CountUnderCallgrind(name, "store", passes, event.prepare, event.run, restore);
     std::cerr << "." << std::flush;
   }
   g_menuBoxes = 10000;

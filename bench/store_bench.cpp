@@ -13,7 +13,6 @@
 //   run under valgrind by bench/callgrind.sh.
 #include <benchmark/benchmark.h>
 #include <stdlib.h>
-#include <valgrind/callgrind.h>
 
 #include <cmath>
 #include <cstdio>
@@ -26,19 +25,17 @@
 #include <string>
 #include <vector>
 
+#include "bench.h"
 #include "call_log.h"
 #include "launcher-data-manager/launcher-data-manager.h"
 #include "sim/device.h"
 
-namespace bench {
-// engine_bench.cpp's rows under callgrind, counted the same way as these.
-void RunEngineUnderCallgrind(const std::string& filter, int maxBoxes, int passes);
-}  // namespace bench
-
 namespace {
 
-enum Storage { kDisk, kMemory };
-const char* const kStorageNames[] = {"disk", "memory"};
+using bench::kDisk;
+using bench::kMemory;
+using bench::kStorageNames;
+using bench::Storage;
 const int kSizes[] = {100, 1000, 10000, 100000};
 
 // Menu 1 holds page 1 with |boxes| application boxes in reading order (ids 1
@@ -47,10 +44,7 @@ const int kSizes[] = {100, 1000, 10000, 100000};
 class Layout {
  public:
   Layout(Storage storage, int boxes) : boxes(boxes) {
-    const char* dir = getenv(storage == kDisk ? "KORRIN_BENCH_DISK_DIR" : "KORRIN_BENCH_MEMORY_DIR");
-    std::string pattern = std::string(dir != NULL ? dir : storage == kDisk ? "/var/tmp" : "/dev/shm") +
-                          "/korrin-bench-XXXXXX";
-    root = mkdtemp(&pattern[0]);
+    root = bench::MakeTempDir(storage, "korrin-bench");
     sim::Device::Get().UseRoot(root);
     store._OpenDb();
     Exec("INSERT INTO Menus(name, type) VALUES('Apps', 0);"
@@ -285,22 +279,13 @@ void RunUnderCallgrind(const std::string& filter, int maxBoxes) {
       op.run(layout);
       bench::StopRecording();
       if (op.restore) op.restore(layout);
-      const std::function<void()> sides[2] = {[&] { log.Replay(layout.store.m_db); },
-                                              [&] { op.run(layout); }};
-      const char* const sideNames[2] = {"floor", "store"};
-      for (int side = 0; side < 2; ++side) {
-        for (int pass = 0; pass <= kCallgrindPasses; ++pass) {
-          if (pass == 1) CALLGRIND_ZERO_STATS;  // pass 0 warms SQLite's caches
-          if (op.prepare) op.prepare(layout);
-          if (pass > 0) CALLGRIND_TOGGLE_COLLECT;
-          sides[side]();
-          if (pass > 0) CALLGRIND_TOGGLE_COLLECT;
-          if (op.restore) op.restore(layout);
-        }
-        // Named: the macro's statements outlive a temporary.
-        std::string dump = name + sideNames[side] + "/" + std::to_string(kCallgrindPasses);
-        CALLGRIND_DUMP_STATS_AT(dump.c_str());
-      }
+      std::function<void()> prepare, restore;
+      if (op.prepare) prepare = [&] { op.prepare(layout); };
+      if (op.restore) restore = [&] { op.restore(layout); };
+      bench::CountUnderCallgrind(name, "floor", kCallgrindPasses, prepare,
+                                 [&] { log.Replay(layout.store.m_db); }, restore);
+      bench::CountUnderCallgrind(name, "store", kCallgrindPasses, prepare,
+                                 [&] { op.run(layout); }, restore);
       std::cerr << "." << std::flush;
     }
   }
