@@ -42,6 +42,7 @@
 #include <map>
 #include <optional>
 #include <string>
+#include <tuple>
 #include <vector>
 
 #include <boost/function.hpp>
@@ -364,6 +365,52 @@ void CheckMenuStored(const GameViewData& menu, int menuId) {
   }
 }
 
+// ---- Steps that call one method with arguments of these types, read in the
+// order of its parameters.
+
+void Read(Input& in, int& value) { value = in.Int(); }
+void Read(Input& in, bool& value) { value = in.Bool(); }
+void Read(Input& in, std::string& value) { value = in.Text(); }
+void Read(Input& in, GameViewData& value) { value = Menu(in); }
+void Read(Input& in, GamePageData& value) { value = Page(in); }
+void Read(Input& in, GameBoxData& value) { value = Box(in); }
+void Read(Input&, BoxPtr& value) { value = NewBox(); }
+
+// The fold over the comma reads left to right; a call's own arguments would
+// be read in an order the compiler picks.
+template <typename T, typename C, typename R, typename... P>
+void Call(T& object, R (C::*method)(P...), Input& in) {
+  std::tuple<std::decay_t<P>...> args;
+  std::apply([&in](auto&... arg) { (Read(in, arg), ...); }, args);
+  std::apply([&object, method](auto&... arg) { (object.*method)(arg...); }, args);
+}
+
+#define STORE(method) \
+  { "store." #method, [](Input& in) { Call(Store(), &LauncherDataManager::method, in); } }
+#define TRACKER(method) \
+  { "tracker." #method, [](Input& in) { Call(Tracker(), &LauncherPackageManager::method, in); } }
+
+// The platform callbacks that take a component type and an application id,
+// and those that take an application handle, each with a list to fill.
+void AppIdListCb(Input& in, bool (*callback)(package_info_app_component_type_e, const char*,
+                                             void*)) {
+  unsigned component = in.Choose(4);
+  std::string text;
+  const char* appId = in.NullableText(text);
+  std::vector<std::string> appIds;
+  callback(static_cast<package_info_app_component_type_e>(component), appId, &appIds);
+}
+
+void AppHandleListCb(Input& in, bool (*callback)(app_info_h, void*)) {
+  AppHandle info(in.Text());
+  std::vector<std::string> texts;
+  callback(info.Get(), &texts);
+}
+
+void Emit(const Event& e) {
+  Dev().EmitPackageEvent(e.type, e.pkgId, e.eventType, e.state, e.progress, e.error);
+}
+
 // ---- The steps.
 
 struct Step {
@@ -378,11 +425,7 @@ const Step kSteps[] = {
     {"device.install", [](Input& in) { Dev().Install(Pkg(in)); }},
     {"device.update", [](Input& in) { Dev().Update(Pkg(in)); }},
     {"device.uninstall", [](Input& in) { Dev().Uninstall(in.Text()); }},
-    {"device.event",
-     [](Input& in) {
-       Event e = ReadEvent(in);
-       Dev().EmitPackageEvent(e.type, e.pkgId, e.eventType, e.state, e.progress, e.error);
-     }},
+    {"device.event", [](Input& in) { Emit(ReadEvent(in)); }},
     {"device.card",
      [](Input& in) {
        if (in.Bool()) {
@@ -426,28 +469,10 @@ const Step kSteps[] = {
        const char* call = in.OneOf(kCalls);
        std::function<void()> action;
        switch (in.Choose(4)) {
-         case 0: {
-           sim::Package pkg = Pkg(in);
-           action = [pkg] { Dev().Install(pkg); };
-           break;
-         }
-         case 1: {
-           sim::Package pkg = Pkg(in);
-           action = [pkg] { Dev().Update(pkg); };
-           break;
-         }
-         case 2: {
-           std::string id = in.Text();
-           action = [id] { Dev().Uninstall(id); };
-           break;
-         }
-         default: {
-           Event e = ReadEvent(in);
-           action = [e] {
-             Dev().EmitPackageEvent(e.type, e.pkgId, e.eventType, e.state, e.progress, e.error);
-           };
-           break;
-         }
+         case 0: action = [pkg = Pkg(in)] { Dev().Install(pkg); }; break;
+         case 1: action = [pkg = Pkg(in)] { Dev().Update(pkg); }; break;
+         case 2: action = [id = in.Text()] { Dev().Uninstall(id); }; break;
+         default: action = [e = ReadEvent(in)] { Emit(e); }; break;
        }
        // An empty callback slot throws out of the nested event only: on a device
        // events never arrive inside a platform call, so the engine frames
@@ -463,11 +488,7 @@ const Step kSteps[] = {
     // Another process takes the database's exclusive lock, or lets it go.
     {"device.lock",
      [](Input&) {
-       if (g.sideLocked) {
-         g.sideLocked = !SideSql("ROLLBACK");
-       } else {
-         g.sideLocked = SideSql("BEGIN EXCLUSIVE");
-       }
+       g.sideLocked = g.sideLocked ? !SideSql("ROLLBACK") : SideSql("BEGIN EXCLUSIVE");
      }},
 
     // The entry points and the exported database helpers.
@@ -494,46 +515,17 @@ const Step kSteps[] = {
 
     // The layout store.
     {"store.Initialize", [](Input&) { Store().Initialize(Tracker()); }},
-    {"store._OpenDb", [](Input&) { Store()._OpenDb(); }},
-    {"store._CreateTables", [](Input&) { Store()._CreateTables(); }},
-    {"store._CloseDb", [](Input&) { Store()._CloseDb(); }},
-    {"store.BeginTransaction", [](Input&) { Store().BeginTransaction(); }},
-    {"store.CommitTransaction", [](Input&) { Store().CommitTransaction(); }},
-    {"store.RollbackTransaction", [](Input&) { Store().RollbackTransaction(); }},
+    STORE(_OpenDb), STORE(_CreateTables), STORE(_CloseDb), STORE(BeginTransaction),
+    STORE(CommitTransaction), STORE(RollbackTransaction),
     {"store.InsertMenuData",
      [](Input& in) {
        GameViewData menu = Menu(in);
        CheckMenuStored(menu, Store().InsertMenuData(menu));
      }},
-    {"store.GetMenuData", [](Input& in) { Store().GetMenuData(in.Int()); }},
-    {"store.UpdateMenuData",
-     [](Input& in) {
-       GameViewData menu = Menu(in);
-       Store().UpdateMenuData(menu);
-     }},
-    {"store.DeleteMenuData", [](Input& in) { Store().DeleteMenuData(in.Int()); }},
-    {"store.GetMenuDataCount", [](Input&) { Store().GetMenuDataCount(); }},
-    {"store.GetMenuDataList", [](Input&) { Store().GetMenuDataList(); }},
-    {"store.InsertPageData",
-     [](Input& in) {
-       GamePageData page = Page(in);
-       Store().InsertPageData(page);
-     }},
-    {"store.UpdatePageData",
-     [](Input& in) {
-       GamePageData page = Page(in);
-       Store().UpdatePageData(page);
-     }},
-    {"store.DeletePageData", [](Input& in) { Store().DeletePageData(in.Int()); }},
-    {"store.DeleteFolderPageData", [](Input& in) { Store().DeleteFolderPageData(in.Int()); }},
-    {"store.GetMenuPageData", [](Input& in) { Store().GetMenuPageData(in.Int()); }},
-    {"store.GetPageDataCount",
-     [](Input& in) {
-       int menuId = in.Int();
-       Store().GetPageDataCount(menuId, in.Bool());
-     }},
-    {"store._GetPageDataCountByDownload",
-     [](Input& in) { Store()._GetPageDataCountByDownload(in.Int()); }},
+    STORE(GetMenuData), STORE(UpdateMenuData), STORE(DeleteMenuData), STORE(GetMenuDataCount),
+    STORE(GetMenuDataList), STORE(InsertPageData), STORE(UpdatePageData), STORE(DeletePageData),
+    STORE(DeleteFolderPageData), STORE(GetMenuPageData), STORE(GetPageDataCount),
+    STORE(_GetPageDataCountByDownload),
     {"store.PageDataForAlphaBeticalOrder",
      [](Input& in) {
        GamePageData page = Page(in);
@@ -541,99 +533,30 @@ const Step kSteps[] = {
        Store().UpdatePageDataForAlphaBeticalOrder(page);
        Store().DeletePageDataForAlphaBeticalOrder(page.pageId);
      }},
-    {"store.InsertBoxData",
+    {"store.InsertBoxData",  // overloaded: the record form
      [](Input& in) {
        GameBoxData box = Box(in);
        Store().InsertBoxData(box);
      }},
-    {"store.UpdateBoxData",
-     [](Input& in) {
-       GameBoxData box = Box(in);
-       Store().UpdateBoxData(box);
-     }},
-    {"store.DeleteBoxData", [](Input& in) { Store().DeleteBoxData(in.Int()); }},
-    {"store.GetMenuBoxData", [](Input& in) { Store().GetMenuBoxData(in.Int()); }},
+    STORE(UpdateBoxData), STORE(DeleteBoxData), STORE(GetMenuBoxData),
     {"store.GetBoxIdByAppId",
      [](Input& in) {
        int parentId = 0, pageId = 0, boxId = 0;
        Store().GetBoxIdByAppId(in.Text(), &parentId, &pageId, &boxId);
      }},
-    {"store.GetBoxDataByAppId", [](Input& in) { Store().GetBoxDataByAppId(in.Text()); }},
-    {"store.GetBoxDataCount", [](Input& in) { Store().GetBoxDataCount(in.Int()); }},
-    {"store.GetPageDataList",
-     [](Input& in) {
-       int parentId = in.Int();
-       Store().GetPageDataList(parentId, in.Bool());
-     }},
-    {"store.GetBoxDataList", [](Input& in) { Store().GetBoxDataList(in.Int()); }},
-    {"store.GetBoxDataListByAppId",
-     [](Input& in) {
-       std::string appId = in.Text();
-       Store().GetBoxDataListByAppId(appId, in.Int());
-     }},
-    {"store.GetBoxDataListByDownload",
-     [](Input& in) {
-       int parentId = in.Int();
-       Store().GetBoxDataListByDownload(parentId, in.Bool());
-     }},
-    {"store.GetPageDataListByDownload",
-     [](Input& in) {
-       int parentId = in.Int();
-       Store().GetPageDataListByDownload(parentId, in.Bool());
-     }},
+    STORE(GetBoxDataByAppId), STORE(GetBoxDataCount), STORE(GetPageDataList),
+    STORE(GetBoxDataList), STORE(GetBoxDataListByAppId), STORE(GetBoxDataListByDownload),
+    STORE(GetPageDataListByDownload),
     {"store.InsertBoxData(appId)",
      [](Input& in) {
        bool pageAdded = false;
        Store().InsertBoxData(in.Text(), pageAdded);
      }},
-    {"store.InsertBoxDataForDeactivatedApp",
-     [](Input& in) {
-       int menuId = in.Int();
-       Store().InsertBoxDataForDeactivatedApp(menuId, in.Text());
-     }},
-    {"store.DeleteBoxDataForDeactivatedApp",
-     [](Input& in) {
-       int menuId = in.Int();
-       Store().DeleteBoxDataForDeactivatedApp(menuId, in.Int());
-     }},
-    {"store._ReorderData",
-     [](Input& in) {
-       int parentId = in.Int();
-       Store()._ReorderData(parentId, in.Bool());
-     }},
-    {"store._ReorderDataWithoutSpace",
-     [](Input& in) {
-       int parentId = in.Int();
-       Store()._ReorderDataWithoutSpace(parentId, in.Bool());
-     }},
-    {"store.RearrangeAppsPosition", [](Input&) { Store().RearrangeAppsPosition(); }},
-    {"store.GetBoxDataListByAlphabeticalOrder",
-     [](Input& in) {
-       int parentId = in.Int();
-       Store().GetBoxDataListByAlphabeticalOrder(parentId, in.Bool());
-     }},
-    {"store.GetBoxDataListByAlphabeticalOrderWithRealPage",
-     [](Input& in) {
-       int parentId = in.Int();
-       Store().GetBoxDataListByAlphabeticalOrderWithRealPage(parentId, in.Bool());
-     }},
-    {"store.GetPageDataListByAlphabeticalOrder",
-     [](Input& in) {
-       int parentId = in.Int();
-       Store().GetPageDataListByAlphabeticalOrder(parentId, in.Bool());
-     }},
-    {"store.InsertBoxDataForAlphaBeticalOrder",
-     [](Input& in) {
-       GameBoxData box = Box(in);
-       Store().InsertBoxDataForAlphaBeticalOrder(box);
-     }},
-    {"store.UpdateBoxDataForAlphaBeticalOrder",
-     [](Input& in) {
-       GameBoxData box = Box(in);
-       Store().UpdateBoxDataForAlphaBeticalOrder(box);
-     }},
-    {"store.DeleteBoxDataForAlphaBeticalOrder",
-     [](Input& in) { Store().DeleteBoxDataForAlphaBeticalOrder(in.Int()); }},
+    STORE(InsertBoxDataForDeactivatedApp), STORE(DeleteBoxDataForDeactivatedApp),
+    STORE(_ReorderData), STORE(_ReorderDataWithoutSpace), STORE(RearrangeAppsPosition),
+    STORE(GetBoxDataListByAlphabeticalOrder), STORE(GetBoxDataListByAlphabeticalOrderWithRealPage),
+    STORE(GetPageDataListByAlphabeticalOrder), STORE(InsertBoxDataForAlphaBeticalOrder),
+    STORE(UpdateBoxDataForAlphaBeticalOrder), STORE(DeleteBoxDataForAlphaBeticalOrder),
 
     // The package tracker. Initialize with empty slots makes the next
     // callback throw, as the launcher's own would.
@@ -648,8 +571,7 @@ const Step kSteps[] = {
      }},
     {"tracker._PkgMgrClientListenCb", [](Input& in) { SendToTracker(in, false); }},
     {"tracker.OnClientListenCb", [](Input& in) { SendToTracker(in, true); }},
-    {"tracker.PauseListenCb", [](Input&) { Tracker().PauseListenCb(); }},
-    {"tracker.StartListenCb", [](Input&) { Tracker().StartListenCb(); }},
+    TRACKER(PauseListenCb), TRACKER(StartListenCb),
     {"tracker._DoPkgJob",
      [](Input& in) {
        boost::shared_ptr<LauncherPackageManager::PkgData> job(new LauncherPackageManager::PkgData);
@@ -658,18 +580,13 @@ const Step kSteps[] = {
        for (unsigned n = in.Choose(4); n > 0; --n) job->appIds.push_back(in.Text());
        Tracker()._DoPkgJob(job);
      }},
-    {"tracker.Terminate", [](Input&) { Tracker().Terminate(); }},
-    {"tracker._RegisterEdbusSignalHandler",
-     [](Input&) { Tracker()._RegisterEdbusSignalHandler(); }},
-    {"tracker.UnregisterEdbusSignalHandler",
-     [](Input&) { Tracker().UnregisterEdbusSignalHandler(); }},
-    {"tracker.OnMMCStatusChanged", [](Input& in) { Tracker().OnMMCStatusChanged(in.Int()); }},
+    TRACKER(Terminate), TRACKER(_RegisterEdbusSignalHandler),
+    TRACKER(UnregisterEdbusSignalHandler), TRACKER(OnMMCStatusChanged),
     {"tracker._BootingDoneSignalCb",
      [](Input& in) {
        LauncherPackageManager::_BootingDoneSignalCb(in.Bool() ? &Tracker() : NULL, NULL);
      }},
-    {"tracker.GetAppInfo", [](Input& in) { Tracker().GetAppInfo(in.Text(), NewBox()); }},
-    {"tracker.GetAppName", [](Input& in) { Tracker().GetAppName(in.Text(), NewBox()); }},
+    TRACKER(GetAppInfo), TRACKER(GetAppName),
     {"tracker._GetAppInfo", [](Input& in) { Tracker()._GetAppInfo(in.Text(), NewBox()); }},
     {"tracker._GetAppInfo(handle)",
      [](Input& in) {
@@ -698,21 +615,14 @@ const Step kSteps[] = {
        std::string text;
        Tracker()._GetAppIds(in.NullableText(text));
      }},
-    {"tracker._IsMenuLaunch", [](Input& in) { Tracker()._IsMenuLaunch(in.Text()); }},
+    TRACKER(_IsMenuLaunch),
     {"tracker._GetAllAppsInfoCb",
      [](Input& in) {
        AppHandle info(in.Text());
        LauncherPackageManager::_GetAllAppsInfoCb(info.Get(), in.Bool() ? NULL : &Tracker());
      }},
     {"tracker._PkgMgrAppInfoGetListCb",
-     [](Input& in) {
-       unsigned component = in.Choose(4);
-       std::string text;
-       const char* appId = in.NullableText(text);
-       std::vector<std::string> appIds;
-       LauncherPackageManager::_PkgMgrAppInfoGetListCb(
-           static_cast<package_info_app_component_type_e>(component), appId, &appIds);
-     }},
+     [](Input& in) { AppIdListCb(in, LauncherPackageManager::_PkgMgrAppInfoGetListCb); }},
     {"tracker._has_mini_app_cb",
      [](Input& in) {
        AppHandle info(in.Text());
@@ -727,12 +637,8 @@ const Step kSteps[] = {
        bool found = false;
        LauncherPackageManager::_app_metadata_list_cb(key, value, in.Bool() ? NULL : &found);
      }},
-    {"tracker.LoadDeactivatedAppList", [](Input&) { Tracker().LoadDeactivatedAppList(); }},
-    {"tracker._GetDeactivatedAppIds", [](Input&) { Tracker()._GetDeactivatedAppIds(); }},
-    {"tracker._GetDeactivatedAppInfo",
-     [](Input& in) { Tracker()._GetDeactivatedAppInfo(in.Text(), NewBox()); }},
-    {"tracker._GetDeactivatedPkgInfo",
-     [](Input& in) { Tracker()._GetDeactivatedPkgInfo(in.Text(), NewBox()); }},
+    TRACKER(LoadDeactivatedAppList), TRACKER(_GetDeactivatedAppIds),
+    TRACKER(_GetDeactivatedAppInfo), TRACKER(_GetDeactivatedPkgInfo),
     {"tracker._PkgMgrDeactivatedPackageInfoGetListCb",
      [](Input& in) {
        package_info_h pkg = NULL;
@@ -743,27 +649,17 @@ const Step kSteps[] = {
      }},
     {"tracker._PkgMgrDeactivatedAppInfoGetListCb",
      [](Input& in) {
-       unsigned component = in.Choose(4);
-       std::string text;
-       const char* appId = in.NullableText(text);
-       std::vector<std::string> appIds;
-       LauncherPackageManager::_PkgMgrDeactivatedAppInfoGetListCb(
-           static_cast<package_info_app_component_type_e>(component), appId, &appIds);
+       AppIdListCb(in, LauncherPackageManager::_PkgMgrDeactivatedAppInfoGetListCb);
      }},
     {"tracker._PkgMgrDeactivatedAppInfoGetCb",
      [](Input& in) {
-       AppHandle info(in.Text());
-       std::vector<std::string> texts;
-       LauncherPackageManager::_PkgMgrDeactivatedAppInfoGetCb(info.Get(), &texts);
+       AppHandleListCb(in, LauncherPackageManager::_PkgMgrDeactivatedAppInfoGetCb);
      }},
     {"tracker._PkgMgrDeactivatedPkgInfoGetCb",
      [](Input& in) {
-       AppHandle info(in.Text());
-       std::vector<std::string> texts;
-       LauncherPackageManager::_PkgMgrDeactivatedPkgInfoGetCb(info.Get(), &texts);
+       AppHandleListCb(in, LauncherPackageManager::_PkgMgrDeactivatedPkgInfoGetCb);
      }},
-    {"tracker.IsMDMAllowed", [](Input& in) { Tracker().IsMDMAllowed(in.Text()); }},
-    {"tracker.IsMDMRestriected", [](Input& in) { Tracker().IsMDMRestriected(in.Text()); }},
+    TRACKER(IsMDMAllowed), TRACKER(IsMDMRestriected),
 
     // The small services.
     {"service.InsertLog",

@@ -238,31 +238,12 @@ Step Generator::Update(const Model& model) {
       app.label = Label();
       step.change = "relabel " + letter + " " + Quoted(app.label);
       break;
-    case 5:
-      app.enabled = false;
-      step.change = "disable " + letter;
-      break;
-    case 6:
-      app.enabled = true;
-      step.change = "enable " + letter;
-      break;
-    case 7:
-      pkg.supportDisable = true;
-      pkg.disabled = true;
-      step.change = "deactivate";
-      break;
-    case 8:
-      pkg.disabled = false;
-      step.change = "reactivate";
-      break;
-    case 9:
-      app.noDisplay = true;
-      step.change = "hide " + letter;
-      break;
-    case 10:
-      app.noDisplay = false;
-      step.change = "show " + letter;
-      break;
+    case 5: app.enabled = false; step.change = "disable " + letter; break;
+    case 6: app.enabled = true; step.change = "enable " + letter; break;
+    case 7: pkg.supportDisable = pkg.disabled = true; step.change = "deactivate"; break;
+    case 8: pkg.disabled = false; step.change = "reactivate"; break;
+    case 9: app.noDisplay = true; step.change = "hide " + letter; break;
+    case 10: app.noDisplay = false; step.change = "show " + letter; break;
     case 11:
       app.game = !app.game;
       step.change = letter + (app.game ? " becomes a game" : " is no longer a game");
