@@ -13,7 +13,7 @@
 #include <vector>
 
 #include "sim/device.h"
-#include "soak/steps.h"
+#include "reliability/soak/steps.h"
 
 namespace soak {
 

@@ -1,4 +1,4 @@
-#include "soak/model.h"
+#include "reliability/soak/model.h"
 
 #include <package_manager.h>
 

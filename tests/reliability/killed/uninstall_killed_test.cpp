@@ -5,7 +5,7 @@
 // has its one box, and the page is closed up to some box and as it was after.
 #include <filesystem>
 
-#include "killed/killed-test.h"
+#include "reliability/killed/killed-test.h"
 #include "korrin-data/korrin-data.h"
 
 namespace {

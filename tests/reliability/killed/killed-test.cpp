@@ -1,4 +1,4 @@
-#include "killed/killed-test.h"
+#include "reliability/killed/killed-test.h"
 
 #include <signal.h>
 #include <stdlib.h>

@@ -29,8 +29,8 @@
 
 #include "korrin-data/korrin-data.h"
 #include "sim/device.h"
-#include "soak/model.h"
-#include "soak/steps.h"
+#include "reliability/soak/model.h"
+#include "reliability/soak/steps.h"
 
 namespace po = boost::program_options;
 

@@ -20,7 +20,7 @@
 #include <thread>
 #include <vector>
 
-#include "database-stress/store-log.h"
+#include "reliability/stress/store-log.h"
 #include "engine/engine-test.h"
 #include "launcher-data-manager/launcher-data-manager.h"
 #include "launcher-package-manager/launcher-package-manager.h"

@@ -4,7 +4,7 @@
 // menu never reached the file.
 #include <algorithm>
 
-#include "killed/killed-test.h"
+#include "reliability/killed/killed-test.h"
 #include "korrin-data/korrin-data.h"
 
 namespace {

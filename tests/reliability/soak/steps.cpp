@@ -1,8 +1,8 @@
-#include "soak/steps.h"
+#include "reliability/soak/steps.h"
 
 #include <package_manager.h>
 
-#include "soak/model.h"
+#include "reliability/soak/model.h"
 
 namespace soak {
 
