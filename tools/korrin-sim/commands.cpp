@@ -1,6 +1,7 @@
 #include "commands.h"
 
 #include <package_manager.h>
+#include <sqlite3.h>
 
 #include <algorithm>
 #include <sstream>
@@ -357,6 +358,25 @@ void RunCount(Session&, const Args& args) {
   for (size_t i = 0; i < calls.size(); ++i) Out() << calls[i] << " " << counts[i] << "\n";
 }
 
+// `trace`: the statements the store's connection runs, as SQLite received them.
+bool g_tracing = false;
+std::vector<std::string> g_statements;  // since the last `trace`
+
+int RecordStatement(unsigned, void*, void*, void* text) {
+  g_statements.push_back(static_cast<const char*>(text));
+  return 0;
+}
+
+void RunTrace(Session&, const Args& args) {
+  if (args.Has("on|off")) {
+    g_tracing = ParseNamed(args.Text("on|off"), {"off", "on"}, "on|off") != 0;
+    FollowStoreTrace();
+  } else {
+    for (const std::string& sql : g_statements) Out() << sql << "\n";
+  }
+  g_statements.clear();
+}
+
 void RunSampleDevice(Session&, const Args&) { Dev().LoadSampleDevice(); }
 
 void RunSay(Session&, const Args& args) { Out() << args.rest() << "\n"; }
@@ -632,6 +652,12 @@ std::vector<Command> MakeCommands() {
              "message", po::bool_switch(), "leave out the file, function and line");
        },
        RunLog},
+      {"trace", "[on|off]", "record the SQL the store runs, or show it",
+       "`trace on` records each statement the store's connection runs, as it starts,\n"
+       "with its parameters unbound; `trace` shows those recorded since the last\n"
+       "`trace`. A connection that a command opens (`start`) is traced from the next\n"
+       "command on.",
+       "trace on\ncall GetMenuDataCount\ntrace", kView, kParsed, NoOptions, RunTrace},
       {"count", "CALL...", "how often the engine made platform calls",
        "Prints how many times each platform call was made since the device began.",
        "count preference_get_int mdm_get_service", kView, kParsed, NoOptions, RunCount},
@@ -667,6 +693,13 @@ std::string Args::Text(const std::string& name) const {
 std::vector<std::string> Args::List(const std::string& name) const {
   return Has(name) ? values_[name].as<std::vector<std::string> >()
                    : std::vector<std::string>();
+}
+
+void FollowStoreTrace() {
+  sqlite3* db = korrin::DataManager().m_db;
+  if (db == NULL) return;
+  sqlite3_trace_v2(db, g_tracing ? SQLITE_TRACE_STMT : 0, g_tracing ? RecordStatement : NULL,
+                   NULL);
 }
 
 const std::vector<Command>& Commands() {

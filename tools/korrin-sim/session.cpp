@@ -185,6 +185,7 @@ void Session::Execute(const std::string& line) {
   std::ostream& outer = Out();
   std::ostringstream output;
   SetOut(&output);
+  FollowStoreTrace();
   try {
     command.run(*this, Args(prepared.values, prepared.words, prepared.rest));
   } catch (...) {
