@@ -62,4 +62,20 @@ TEST_F(StoreTest, APlacementOpensAPageAfterTheLastRowOrForADeactivatedAppTwoRows
                      "WHERE boxId IN (8, 9, 25, 26)"));
 }
 
+// The computed views and the packing turn a page after m_maxRows rows as well.
+TEST_F(StoreTest, TheViewsAndThePackingTurnAPageAfterTheLastRow) {
+  store.m_maxRows = 2;
+  bool pageAdded = false;
+  for (int i = 0; i < 9; ++i) store.InsertBoxData("app", pageAdded);
+  EXPECT_EQ(100002, store.GetBoxDataListByDownload(1, false).back()->pageId);
+  EXPECT_EQ(2u, store.GetPageDataListByDownload(1, false).size());
+  EXPECT_EQ(100002, store.GetBoxDataListByAlphabeticalOrder(1, false).back()->pageId);
+  EXPECT_EQ(2u, store.GetPageDataListByAlphabeticalOrder(1, false).size());
+  db.Exec("UPDATE Boxes SET pageId = 1, col = 9, row = 9");
+  store._ReorderData(1, false);
+  EXPECT_EQ("1,1 4,2 9,9 1", db.Value("SELECT group_concat(col || ',' || row, ' ') || ' ' || "
+                                      "(SELECT COUNT(*) FROM Pages) FROM Boxes WHERE boxId IN "
+                                      "(1, 8, 9)"));
+}
+
 }  // namespace
