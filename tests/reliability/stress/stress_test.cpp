@@ -82,49 +82,40 @@ TEST(SleepCatcherTest, SeesSqliteAndStandardSleeps) {
   EXPECT_EQ(2, g_sleeps);
 }
 
-// Another process that holds the lock |sql| takes (with what it writes)
-// until Commit. Fork it only while this one holds no lock on the file, or
-// the child would inherit SQLite's record of it.
+// Another process that takes the lock |sql| takes, with what it writes, and
+// commits as this object goes. Fork it only while this one holds no lock on
+// the file, or the child would inherit SQLite's record of it.
 class OtherProcess {
  public:
   OtherProcess(const std::string& path, const std::string& sql) {
-    int wait[2], answer[2];
-    if (pipe(wait) != 0 || pipe(answer) != 0 || (m_pid = fork()) < 0) abort();
+    int up[2];
+    if (pipe(m_down) != 0 || pipe(up) != 0 || (m_pid = fork()) < 0) abort();
     if (m_pid == 0) {
-      close(wait[1]);
+      close(m_down[1]);
       sqlite3* db = NULL;
       sqlite3_open(path.c_str(), &db);
-      FILE* out = fdopen(answer[1], "w");
-      fprintf(out, "%d\n", sqlite3_exec(db, sql.c_str(), NULL, NULL, NULL));
-      fflush(out);
-      while (read(wait[0], &m_pid, sizeof m_pid) > 0) continue;  // until Commit closes it
-      fprintf(out, "%d\n", sqlite3_exec(db, "COMMIT", NULL, NULL, NULL));
-      fclose(out);
+      char rc = static_cast<char>(sqlite3_exec(db, sql.c_str(), NULL, NULL, NULL));
+      // Then waits until the pipe down closes.
+      if (write(up[1], &rc, 1) == 1 && read(m_down[0], &rc, 1) == 0) {
+        sqlite3_exec(db, "COMMIT", NULL, NULL, NULL);
+      }
       _exit(0);
     }
-    close(wait[0]);
-    close(answer[1]);
-    m_wait = wait[1];
-    m_answer = fdopen(answer[0], "r");
-    EXPECT_EQ(1, fscanf(m_answer, "%d", &held));
+    close(m_down[0]);
+    close(up[1]);
+    char rc = -1;
+    held = read(up[0], &rc, 1) == 1 ? rc : -1;
+    close(up[0]);
   }
-  ~OtherProcess() { Commit(); }
-  int Commit() {
-    int rc = -1;
-    if (m_wait < 0) return rc;
-    close(m_wait);
-    m_wait = -1;
-    EXPECT_EQ(1, fscanf(m_answer, "%d", &rc));
-    fclose(m_answer);
+  ~OtherProcess() {
+    close(m_down[1]);
     waitpid(m_pid, NULL, 0);
-    return rc;
   }
-  int held = -1;  // |sql|'s result code
+  int held;  // |sql|'s result code
 
  private:
+  int m_down[2];
   pid_t m_pid;
-  int m_wait = -1;
-  FILE* m_answer = NULL;
 };
 
 enum Condition { kExclusiveLock, kReservedLock, kBroken, kReadOnly, kFullDisk };
@@ -144,8 +135,8 @@ class StressTest : public SimTest {
     }
   }
 
-  // Menu 1 "Apps", its page 1 and boxes 1 "a" and 2 "b", written through
-  // the store, which stays open unless |close|.
+  // Menu 1 "Apps", its page 1 and boxes 1 "a" and 2 "b"; the store stays
+  // open unless |close|.
   void WriteRows(bool close = false) {
     store._OpenDb();
     SqlProbe(DbPath()).Exec(
@@ -157,12 +148,6 @@ class StressTest : public SimTest {
     rows = SqlProbe(DbPath()).Layout();
     device.ClearLogs();
   }
-
-  // The rest of the scope runs as "nobody" (real and effective user, as
-  // access() asks about the real one), the saved user root for the way back.
-  // False where that cannot be done, and root would pass the file's mode.
-  bool AsNobody() { return geteuid() != 0 || setresuid(65534, 65534, 0) == 0; }
-  ~StressTest() override { EXPECT_EQ(0, geteuid() == 0 ? 0 : setresuid(0, 0, 0)); }
 
   // Every kind of store operation under |condition|, without sleeping: its
   // answer, and under a lock the refused lock requests, six a statement.
@@ -197,7 +182,6 @@ class StressTest : public SimTest {
         OP(GetBoxIdByAppId("b", &parentId, &pageId, &boxId), true, {0, 1, 0, 1, 1}),
         OP(GetBoxDataByAppId("b")->boxId, true, {0, 2, 0, 2, 2}),
         OP(GetPageDataList(1, false).size(), true, {0, 1, 0, 1, 1}),
-        OP(GetBoxDataList(1).size(), true, {0, 2, 0, 2, 2}),
         OP(GetBoxDataListByAlphabeticalOrder(1, false).size(), true, {0, 2, 0, 2, 2}),
         // A menu always has its first virtual page.
         OP(GetPageDataListByAlphabeticalOrder(1, false).size(), true, {1, 1, 1, 1, 1}),
@@ -214,28 +198,38 @@ class StressTest : public SimTest {
     });
   }
 
-  // Under the lock |begin| takes in another process, which also adds a
-  // menu: once it commits, every row is there and the store writes again.
+  // The operations under the lock |begin| takes in another process, which
+  // also adds a menu; once it commits every row is there, and the store
+  // writes again.
   void UnderALock(const std::string& begin, Condition condition) {
     WriteRows();
-    OtherProcess other(DbPath(), begin + "; INSERT INTO Menus(name, type) VALUES('Other', 9)");
-    ASSERT_EQ(SQLITE_OK, other.held);
-    EveryOperationUnder(condition);
-    ASSERT_EQ(SQLITE_OK, other.Commit());
+    {
+      OtherProcess other(DbPath(), begin + "; INSERT INTO Menus(name, type) VALUES('Other', 9)");
+      ASSERT_EQ(SQLITE_OK, other.held);
+      EveryOperationUnder(condition);
+    }
     rows.insert(rows.begin() + 1, Row{"2", "Other", "9"});
-    ExpectRowsKeptAndWritesAgain();
+    ExpectRowsKept(true);
   }
 
-  void ExpectRowsKeptAndWritesAgain() {
+  void ExpectRowsKept(bool writesAgain) {
     EXPECT_EQ(rows, SqlProbe(DbPath()).Layout());
     GameBoxData box;
-    EXPECT_LT(2, store.InsertBoxData(box));
-    EXPECT_EQ("ok", SqlProbe(DbPath()).Value("PRAGMA integrity_check"));
+    if (writesAgain) {
+      EXPECT_LT(2, store.InsertBoxData(box));
+    }
   }
+
+  // The file's own mode refuses only a user other than root: the test runs
+  // on as "nobody" (real and effective, as access() asks about the real
+  // one), root staying the saved user. False where root cannot be given up.
+  bool AsNobody() { return geteuid() != 0 || (nobody = setresuid(65534, 65534, 0) == 0); }
+  void AsRootAgain() { EXPECT_TRUE(!nobody || setresuid(0, 0, 0) == 0); }
 
   LauncherDataManager store;
   LauncherPackageManager packages;
   std::vector<Row> rows;
+  bool nobody = false;
 };
 
 TEST_F(StressTest, ExclusiveLockRefusesEveryOperationAfterFiveImmediateRetries) {
@@ -257,8 +251,8 @@ TEST_F(StressTest, UnreadableFileLeavesTheStoreUnopenedAnsweringFailures) {
   EXPECT_TRUE(store.Initialize(packages));  // the ids are listed and nothing is stored
   EXPECT_EQ(nullptr, store.m_db);
   EveryOperationUnder(kBroken);
-  ASSERT_EQ(0, setresuid(0, 0, 0));
-  EXPECT_EQ(rows, SqlProbe(DbPath()).Layout());
+  AsRootAgain();
+  ExpectRowsKept(false);
 }
 
 TEST_F(StressTest, ReadOnlyFileIsReadAndRefusesEveryWrite) {
@@ -269,7 +263,7 @@ TEST_F(StressTest, ReadOnlyFileIsReadAndRefusesEveryWrite) {
   EveryOperationUnder(kReadOnly);
   EXPECT_EQ(std::vector<std::string>{"E sqlite error : attempt to write a readonly database"},
             EngineMessages());
-  EXPECT_EQ(rows, SqlProbe(DbPath()).Layout());
+  ExpectRowsKept(false);
 }
 
 // A file size limit, SIGXFSZ ignored, fails a write with EFBIG: SQLite's I/O
@@ -284,7 +278,7 @@ TEST_F(StressTest, FullDiskRefusesEveryWriteAndWritesAgainOnceFreed) {
   EveryOperationUnder(kFullDisk);
   ASSERT_EQ(0, setrlimit(RLIMIT_FSIZE, &room));
   EXPECT_EQ(std::vector<std::string>{"E sqlite error : disk I/O error"}, EngineMessages());
-  ExpectRowsKeptAndWritesAgain();
+  ExpectRowsKept(true);
 }
 
 TEST_F(StressTest, GarbageFileAnswersFailuresAndIsNeverOverwritten) {
@@ -294,8 +288,7 @@ TEST_F(StressTest, GarbageFileAnswersFailuresAndIsNeverOverwritten) {
   EXPECT_TRUE(store.Initialize(packages));
   EveryOperationUnder(kBroken);
   std::string bytes(garbage.size() + 1, '\0');
-  EXPECT_EQ(garbage.size(), std::ifstream(DbPath()).read(&bytes[0], bytes.size()).gcount());
-  EXPECT_EQ(garbage, bytes.substr(0, garbage.size()));
+  EXPECT_EQ(garbage, bytes.substr(0, std::ifstream(DbPath()).read(&bytes[0], bytes.size()).gcount()));
 }
 
 }  // namespace
