@@ -1,9 +1,9 @@
 // The launcher killed in the middle of a write. Children of the test process
-// (each from the library as loaded) run the engine through the file shim and
-// die with SIGKILL before a numbered file operation that changes files; the
+// (each from the library as loaded) run the engine on 60 games through the
+// file shim and die with SIGKILL before a numbered file operation; the
 // database left must check out, and the next start must take it as it
-// stands. The same statements on the same files make the same operations, so
-// a failing kill comes again at the same number.
+// stands. The same statements make the same operations, so a failing kill
+// comes again at the same number.
 #include <signal.h>
 #include <sys/wait.h>
 #include <unistd.h>
@@ -28,26 +28,29 @@ typedef std::vector<Row> Layout;  // as SqlProbe::Layout reads it
 // The head of a rollback journal whose transaction has not ended; a journal
 // kept after its commit (PERSIST) starts with zeros.
 const char kJournalMagic[] = "\xd9\xd5\x05\xf9\x20\xa1\x63\xd7";
-const size_t kFirstBox = 2, kAppId = 4, kCol = 6, kRow = 7;  // in a one-page layout
+const size_t kFirstBox = 2, kCol = 6, kRow = 7;  // in a one-page layout
+const Lines kNotFirst = {"W it's not the first launch"};
 
 long g_operations = 0;  // file operations the child made so far
 
 class KilledTest : public SimTest {
  protected:
-  struct Run {
-    long operations;  // made, when it ran to the end
-    Lines logs;       // EngineMessages meanwhile
-  };
+  KilledTest() {
+    for (int i = 1; i <= 60; ++i) {
+      std::string id = (i < 10 ? "game0" : "game") + std::to_string(i);
+      device.AddGame(id, id);
+    }
+  }
 
   // Runs |body| in a child that dies with SIGKILL before file operation
-  // |killAt| (never when 0). Syncs are counted but skipped: SIGKILL loses
-  // nothing that reached the kernel, and thousands of fsyncs take long.
-  Run Child(long killAt, const std::function<void()>& body) {
+  // |killAt| (never when 0). Returns the operations it made and what it
+  // logged, when it ran to the end. Syncs are counted but skipped: SIGKILL
+  // loses nothing that reached the kernel, and thousands of fsyncs take long.
+  std::pair<long, Lines> Child(long killAt, const std::function<void()>& body) {
     const std::string report = root + "/child-report";
     fs::remove(report);
     pid_t pid = fork();
     if (pid == 0) {
-      g_operations = 0;
       fileshim::Install([killAt](fileshim::Op op, const std::function<int()>& perform) {
         if (op == fileshim::Op::kLock) return perform();
         if (++g_operations == killAt) raise(SIGKILL);
@@ -55,11 +58,10 @@ class KilledTest : public SimTest {
       });
       device.ClearLogs();
       body();
-      {
-        std::ofstream out(report);
-        out << g_operations << "\n";
-        for (const std::string& line : EngineMessages()) out << line << "\n";
-      }
+      std::ofstream out(report);
+      out << g_operations << "\n";
+      for (const std::string& line : EngineMessages()) out << line << "\n";
+      out.close();
       _exit(0);  // not exit(): the test process's objects are not the child's to end
     }
     int status = -1;
@@ -67,30 +69,17 @@ class KilledTest : public SimTest {
     EXPECT_TRUE(killAt != 0 ? WIFSIGNALED(status) && WTERMSIG(status) == SIGKILL
                             : WIFEXITED(status) && WEXITSTATUS(status) == 0)
         << "the child ended with status " << status;
-    Run run = {-1, {}};
+    std::pair<long, Lines> run(-1, Lines());
     std::ifstream in(report);
-    in >> run.operations;
+    in >> run.first;
     in.ignore();
-    for (std::string line; std::getline(in, line);) run.logs.push_back(line);
+    for (std::string line; std::getline(in, line);) run.second.push_back(line);
     return run;
   }
 
-  // |count| kill points over operations 1 to |last|, one at a seeded place
-  // in each equal stretch; KORRIN_KILL_SEED replaces the seed.
-  std::vector<long> Plan(long last, int count) {
-    const char* seed = getenv("KORRIN_KILL_SEED");
-    std::mt19937 random(seed != nullptr ? atol(seed) : 20150601);
-    std::vector<long> plan;
-    for (int i = 0; i < count; ++i) {
-      long from = 1 + last * i / count, to = std::max(from, last * (i + 1) / count);
-      plan.push_back(std::uniform_int_distribution<long>(from, to)(random));
-    }
-    return plan;
-  }
-
   // Kills |body| before operation |killAt|, then starts the engine again
-  // after |before| and returns that start's logs. The database must check
-  // out; a journal left live by the kill is counted.
+  // after |before|, and returns that start's logs. The database must check
+  // out; a journal the kill left live is counted.
   Lines KillAndRestart(long killAt, const std::function<void()>& body,
                        const std::function<void()>& before = [] {}) {
     Child(killAt, body);
@@ -100,21 +89,23 @@ class KilledTest : public SimTest {
     Lines logs = Child(0, [&] {
                    before();
                    data_engin_initialization();
-                 }).logs;
+                 }).second;
     EXPECT_EQ("ok", SqlProbe(DbPath()).Value("PRAGMA integrity_check")) << "killed at " << killAt;
     return logs;
   }
 
-  void AddGames(int count) {
-    for (int i = 1; i <= count; ++i) {
-      std::string id = (i < 10 ? "game0" : "game") + std::to_string(i);
-      device.AddGame(id, id);
-    }
+  // 20 kill points over operations 1 to |last|, one in each equal stretch.
+  std::vector<long> Plan(long last) {
+    std::minstd_rand random(20150601);
+    std::vector<long> plan;
+    for (long i = 0; i < 20; ++i) plan.push_back(1 + last * i / 20 + random() % (last / 20));
+    return plan;
   }
 
-  void RemoveDatabase() {  // as on a new phone
-    fs::remove(DbPath());
+  void UseDatabase(const std::string& copy) {
     fs::remove(DbPath() + "-journal");
+    fs::remove(DbPath());
+    if (!copy.empty()) fs::copy_file(copy, DbPath());
   }
 
   int hotJournals = 0;
@@ -124,24 +115,25 @@ class KilledTest : public SimTest {
 // the next start takes a store with a menu as it stands, and makes the whole
 // first layout only when the menu never reached the file.
 TEST_F(KilledTest, AFirstLaunchKilledAnywhereLeavesWhatTheNextStartTakesAsItStands) {
-  long toTheMenu = Child(0, data_engin_initialization).operations;  // no game yet
-  RemoveDatabase();
-  AddGames(60);
-  Run complete = Child(0, data_engin_initialization);
+  long toTheMenu = Child(0, [&] {
+                     device.Reset();  // no game
+                     data_engin_initialization();
+                   }).first;
+  UseDatabase("");
+  std::pair<long, Lines> complete = Child(0, data_engin_initialization);
   const Layout firstLayout = SqlProbe(DbPath()).Layout();
-  std::vector<long> plan = Plan(complete.operations, 20);
+  std::vector<long> plan = Plan(complete.first);
   for (long at = 1; at <= toTheMenu + 2; ++at) plan.push_back(at);
   size_t again = 0;
   for (long at : plan) {
-    RemoveDatabase();
+    UseDatabase("");
     Lines logs = KillAndRestart(at, data_engin_initialization);
     Layout after = SqlProbe(DbPath()).Layout();
-    again += logs == complete.logs;
-    EXPECT_TRUE(logs == complete.logs ? after == firstLayout
-                                      : logs == Lines{"W it's not the first launch"} &&
-                                            after.size() <= firstLayout.size() &&
-                                            std::equal(after.begin(), after.end(),
-                                                       firstLayout.begin()))
+    again += logs == complete.second;
+    EXPECT_TRUE(logs == complete.second ? after == firstLayout
+                                        : logs == kNotFirst && after.size() <= firstLayout.size() &&
+                                              std::equal(after.begin(), after.end(),
+                                                         firstLayout.begin()))
         << "killed at " << at << ": not the first launch, nor a part of it taken as it stands";
   }
   EXPECT_LT(0u, again) << "no kill before the menu";
@@ -151,15 +143,13 @@ TEST_F(KilledTest, AFirstLaunchKilledAnywhereLeavesWhatTheNextStartTakesAsItStan
 
 // The uninstall deletes the game's box, then rewrites every other box of the
 // page from the first cell, each in a commit of its own, and nothing finishes
-// a killed sequence later: the page is kept closed up to some box and as it
-// was after it.
+// a killed sequence later: the page stays closed up to some box and as it was
+// after it.
 TEST_F(KilledTest, AnUninstallKilledWhileThePageClosesUpLeavesItClosedUpToABox) {
-  AddGames(60);
   Child(0, data_engin_initialization);
   const Layout laidOut = SqlProbe(DbPath()).Layout();
-  ASSERT_EQ("game01", laidOut[kFirstBox][kAppId]);
   fs::copy_file(DbPath(), root + "/laid-out.db");
-  // |laidOut| without game01, its first |moved| other boxes in the cells
+  // |laidOut| without game01's box, the first |moved| others in the cells
   // from the first, four wide.
   auto closedUp = [&](size_t moved) {
     Layout rows(laidOut.begin(), laidOut.begin() + kFirstBox);
@@ -176,12 +166,10 @@ TEST_F(KilledTest, AnUninstallKilledWhileThePageClosesUpLeavesItClosedUpToABox) 
     device.Uninstall("game01");
   };
   int partly = 0;
-  for (long at : Plan(Child(0, uninstall).operations, 20)) {
-    RemoveDatabase();
-    fs::copy_file(root + "/laid-out.db", DbPath());
+  for (long at : Plan(Child(0, uninstall).first)) {
+    UseDatabase(root + "/laid-out.db");
     // The platform finished the uninstall; only the launcher was killed.
-    EXPECT_EQ(Lines{"W it's not the first launch"},
-              KillAndRestart(at, uninstall, [&] { device.RemovePackage("game01"); }));
+    EXPECT_EQ(kNotFirst, KillAndRestart(at, uninstall, [&] { device.RemovePackage("game01"); }));
     Layout after = SqlProbe(DbPath()).Layout();
     size_t moved = 0;
     while (moved < laidOut.size() && closedUp(moved) != after) ++moved;
