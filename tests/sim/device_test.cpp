@@ -1,6 +1,6 @@
 // Injected failures, which the fault sweep and the failure tests stand on:
-// they hold once, after the calls to let pass, or until cleared, and only
-// calls with a result can be failed. (The sweep shows the handle count.)
+// they hold once, after the calls let pass, or until cleared; a call without
+// an error code fails by its result; only calls with a result can fail.
 #include <app_manager.h>
 #include <bundle.h>
 
@@ -8,35 +8,29 @@
 
 #include "support/sim-test.h"
 
-namespace {
-
-int Open(const char* appId) {
-  app_info_h info = NULL;
-  int rc = app_info_create(appId, &info);
-  if (rc == APP_MANAGER_ERROR_NONE) app_info_destroy(info);
-  return rc;
-}
-
 class DeviceTest : public SimTest {};
 
 TEST_F(DeviceTest, InjectedFailuresHoldOnceOrUntilClearedAndOnlyForKnownCalls) {
   device.AddGame("racer", "Racer");
+  std::vector<int> results;
+  auto open = [&] {
+    app_info_h info = NULL;
+    results.push_back(app_info_create("racer", &info));
+    if (info != NULL) app_info_destroy(info);
+  };
   device.FailNext("app_info_create", APP_MANAGER_ERROR_IO_ERROR, 1);
-  EXPECT_EQ(0, Open("racer"));
-  EXPECT_EQ(APP_MANAGER_ERROR_IO_ERROR, Open("racer"));
-  EXPECT_EQ(0, Open("racer"));
+  open(), open(), open();
   device.FailAlways("app_info_create", APP_MANAGER_ERROR_DB_FAILED);
-  EXPECT_EQ(APP_MANAGER_ERROR_DB_FAILED, Open("racer"));
-  EXPECT_EQ(APP_MANAGER_ERROR_DB_FAILED, Open("racer"));
+  open(), open();
   device.ClearFailures();
-  EXPECT_EQ(0, Open("racer"));
-  EXPECT_EQ(6, device.CallCount("app_info_create"));
-  device.FailNext("bundle_create", BUNDLE_ERROR_OUT_OF_MEMORY);  // fails by its result
+  open();
+  EXPECT_EQ((std::vector<int>{0, APP_MANAGER_ERROR_IO_ERROR, 0, APP_MANAGER_ERROR_DB_FAILED,
+                              APP_MANAGER_ERROR_DB_FAILED, 0}),
+            results);
+  device.FailNext("bundle_create", BUNDLE_ERROR_OUT_OF_MEMORY);
   EXPECT_EQ(nullptr, bundle_create());
   EXPECT_EQ(BUNDLE_ERROR_OUT_OF_MEMORY, get_last_result());
   EXPECT_THROW(device.FailNext("app_info_get_lable", -5), std::invalid_argument);
   EXPECT_THROW(device.FailAlways("e_dbus_shutdown", -5), std::invalid_argument);  // void
   EXPECT_THROW(device.FailNext("app_info_create", 0), std::invalid_argument);
 }
-
-}  // namespace
