@@ -9,6 +9,7 @@
 #include <signal.h>
 #include <sys/resource.h>
 #include <sys/select.h>
+#include <sys/socket.h>
 #include <sys/stat.h>
 #include <sys/wait.h>
 #include <time.h>
@@ -86,33 +87,29 @@ TEST(SleepCatcherTest, SeesSqliteAndStandardSleeps) {
 class OtherProcess {
  public:
   OtherProcess(const std::string& path, const std::string& sql) {
-    int up[2];
-    if (pipe(m_down) != 0 || pipe(up) != 0 || (m_pid = fork()) < 0) abort();
+    if (socketpair(AF_UNIX, SOCK_STREAM, 0, m_ends) != 0 || (m_pid = fork()) < 0) abort();
     if (m_pid == 0) {
-      close(m_down[1]);
+      close(m_ends[0]);
       sqlite3* db = NULL;
       sqlite3_open(path.c_str(), &db);
       char rc = static_cast<char>(sqlite3_exec(db, sql.c_str(), NULL, NULL, NULL));
-      // Then waits until the pipe down closes.
-      if (write(up[1], &rc, 1) == 1 && read(m_down[0], &rc, 1) == 0) {
+      if (write(m_ends[1], &rc, 1) == 1 && read(m_ends[1], &rc, 1) == 0) {  // until closed
         sqlite3_exec(db, "COMMIT", NULL, NULL, NULL);
       }
       _exit(0);
     }
-    close(m_down[0]);
-    close(up[1]);
+    close(m_ends[1]);
     char rc = -1;
-    held = read(up[0], &rc, 1) == 1 ? rc : -1;
-    close(up[0]);
+    held = read(m_ends[0], &rc, 1) == 1 ? rc : -1;
   }
   ~OtherProcess() {
-    close(m_down[1]);
+    close(m_ends[0]);
     waitpid(m_pid, NULL, 0);
   }
   int held;  // |sql|'s result code
 
  private:
-  int m_down[2];
+  int m_ends[2];
   pid_t m_pid;
 };
 
