@@ -77,11 +77,16 @@ class KilledTest : public SimTest {
     return run;
   }
 
-  // Kills |body| before operation |killAt|, then starts the engine again
-  // after |before|, and returns that start's logs. The database must check
-  // out; a journal the kill left live is counted.
-  Lines KillAndRestart(long killAt, const std::function<void()>& body,
-                       const std::function<void()>& before = [] {}) {
+  // Kills |body|, run on the database |from| (none when empty), before
+  // operation |killAt|, then starts the engine after |before|. Returns that
+  // start's logs and the layout after it, in a database that checks out; a
+  // journal the kill left live is counted.
+  std::pair<Lines, Layout> KillAndRestart(const std::string& from, long killAt,
+                                          const std::function<void()>& body,
+                                          const std::function<void()>& before = [] {}) {
+    fs::remove(DbPath() + "-journal");
+    fs::remove(DbPath());
+    if (!from.empty()) fs::copy_file(from, DbPath());
     Child(killAt, body);
     char head[8] = {};
     std::ifstream(DbPath() + "-journal", std::ios::binary).read(head, sizeof head);
@@ -90,8 +95,9 @@ class KilledTest : public SimTest {
                    before();
                    data_engin_initialization();
                  }).second;
-    EXPECT_EQ("ok", SqlProbe(DbPath()).Value("PRAGMA integrity_check")) << "killed at " << killAt;
-    return logs;
+    SqlProbe db(DbPath());
+    EXPECT_EQ("ok", db.Value("PRAGMA integrity_check")) << "killed at " << killAt;
+    return std::make_pair(logs, db.Layout());
   }
 
   // 20 kill points over operations 1 to |last|, one in each equal stretch.
@@ -100,12 +106,6 @@ class KilledTest : public SimTest {
     std::vector<long> plan;
     for (long i = 0; i < 20; ++i) plan.push_back(1 + last * i / 20 + random() % (last / 20));
     return plan;
-  }
-
-  void UseDatabase(const std::string& copy) {
-    fs::remove(DbPath() + "-journal");
-    fs::remove(DbPath());
-    if (!copy.empty()) fs::copy_file(copy, DbPath());
   }
 
   int hotJournals = 0;
@@ -119,21 +119,20 @@ TEST_F(KilledTest, AFirstLaunchKilledAnywhereLeavesWhatTheNextStartTakesAsItStan
                      device.Reset();  // no game
                      data_engin_initialization();
                    }).first;
-  UseDatabase("");
+  fs::remove(DbPath());
   std::pair<long, Lines> complete = Child(0, data_engin_initialization);
   const Layout firstLayout = SqlProbe(DbPath()).Layout();
   std::vector<long> plan = Plan(complete.first);
   for (long at = 1; at <= toTheMenu + 2; ++at) plan.push_back(at);
   size_t again = 0;
   for (long at : plan) {
-    UseDatabase("");
-    Lines logs = KillAndRestart(at, data_engin_initialization);
-    Layout after = SqlProbe(DbPath()).Layout();
-    again += logs == complete.second;
-    EXPECT_TRUE(logs == complete.second ? after == firstLayout
-                                        : logs == kNotFirst && after.size() <= firstLayout.size() &&
-                                              std::equal(after.begin(), after.end(),
-                                                         firstLayout.begin()))
+    std::pair<Lines, Layout> next = KillAndRestart("", at, data_engin_initialization);
+    const Layout& after = next.second;
+    again += next.first == complete.second;
+    EXPECT_TRUE(next.first == complete.second
+                    ? after == firstLayout
+                    : next.first == kNotFirst && after.size() <= firstLayout.size() &&
+                          std::equal(after.begin(), after.end(), firstLayout.begin()))
         << "killed at " << at << ": not the first launch, nor a part of it taken as it stands";
   }
   EXPECT_LT(0u, again) << "no kill before the menu";
@@ -148,7 +147,8 @@ TEST_F(KilledTest, AFirstLaunchKilledAnywhereLeavesWhatTheNextStartTakesAsItStan
 TEST_F(KilledTest, AnUninstallKilledWhileThePageClosesUpLeavesItClosedUpToABox) {
   Child(0, data_engin_initialization);
   const Layout laidOut = SqlProbe(DbPath()).Layout();
-  fs::copy_file(DbPath(), root + "/laid-out.db");
+  const std::string laidOutFile = root + "/laid-out.db";
+  fs::copy_file(DbPath(), laidOutFile);
   // |laidOut| without game01's box, the first |moved| others in the cells
   // from the first, four wide.
   auto closedUp = [&](size_t moved) {
@@ -167,13 +167,13 @@ TEST_F(KilledTest, AnUninstallKilledWhileThePageClosesUpLeavesItClosedUpToABox) 
   };
   int partly = 0;
   for (long at : Plan(Child(0, uninstall).first)) {
-    UseDatabase(root + "/laid-out.db");
     // The platform finished the uninstall; only the launcher was killed.
-    EXPECT_EQ(kNotFirst, KillAndRestart(at, uninstall, [&] { device.RemovePackage("game01"); }));
-    Layout after = SqlProbe(DbPath()).Layout();
+    std::pair<Lines, Layout> next =
+        KillAndRestart(laidOutFile, at, uninstall, [&] { device.RemovePackage("game01"); });
+    EXPECT_EQ(kNotFirst, next.first);
     size_t moved = 0;
-    while (moved < laidOut.size() && closedUp(moved) != after) ++moved;
-    EXPECT_TRUE(after == laidOut || moved < laidOut.size())
+    while (moved < laidOut.size() && closedUp(moved) != next.second) ++moved;
+    EXPECT_TRUE(next.second == laidOut || moved < laidOut.size())
         << "killed at " << at << ": not the page closed up to a box and as it was after it";
     partly += moved > 0 && moved < laidOut.size() - kFirstBox - 1;
   }
