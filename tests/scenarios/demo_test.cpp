@@ -1,5 +1,6 @@
-// The demo as the README runs it: a fresh device, a story that ends well, and
-// nothing of its own wider than an 80-column terminal.
+// The demo as the README runs it: a fresh device, a story that ends well and
+// shows every step's home screen, and nothing of its own (the device root is
+// the user's path) wider than an 80-column terminal.
 #include <stdio.h>
 #include <sys/wait.h>
 
@@ -17,15 +18,13 @@ TEST(DemoTest, EndsWellWithinEightyColumns) {
   for (size_t n; (n = fread(buffer, 1, sizeof buffer, demo)) > 0;) output.append(buffer, n);
   int status = pclose(demo);
   ASSERT_TRUE(WIFEXITED(status) && WEXITSTATUS(status) == 0) << output;
-
   std::istringstream lines(output);
   int count = 0;
   for (std::string line; std::getline(lines, line); ++count) {
-    // The root is the user's own path, not the demo's text.
     if (line.find(ROOT) != std::string::npos) line.erase(line.find(ROOT), sizeof ROOT - 1);
-    size_t width = 0;  // characters, a UTF-8 sequence counting as one
+    size_t width = 0;  // a UTF-8 sequence is one character
     for (unsigned char c : line) width += (c & 0xC0) != 0x80;
     EXPECT_LE(width, 80u) << line;
   }
-  EXPECT_GT(count, 50) << output;  // every step showed its home screen
+  EXPECT_GT(count, 50) << output;
 }
