@@ -140,8 +140,6 @@ class StressTest : public SimTest {
   // Every kind of store operation under |condition|, without a wait: its
   // answer, and under a lock the refused lock requests, six a statement.
   void EveryOperationUnder(Condition condition) {
-    GameViewData menu;
-    menu.menuId = 1;
     GameBoxData box;
     box.boxId = box.pageId = 1;
     box.appId = "c";
@@ -156,10 +154,8 @@ class StressTest : public SimTest {
 #define OP(call, reads, ...) {#call, [&] { return static_cast<int>(store.call); }, reads, __VA_ARGS__}
         // Inserts do not look at their step: they answer this connection's
         // last row id, or the id the row would have had; updates succeed.
-        OP(InsertMenuData(menu), false, {0, 0, -1, 0, 2}),
         OP(InsertBoxData(box), false, {0, 0, -1, 0, 3}),
         OP(InsertBoxData("c", pageAdded), false, {0, 0, -1, 0, 3}),
-        OP(UpdateMenuData(menu), false, {1, 1, 0, 1, 1}),
         OP(UpdateBoxData(box), false, {1, 1, 1, 1, 1}),
         OP(DeleteBoxData(1), false, {0, 0, 0, 0, 0}),
         // A read-only file still takes a read transaction.
@@ -197,11 +193,14 @@ class StressTest : public SimTest {
     EXPECT_EQ(3, store.InsertBoxData(box));
   }
 
-  // Only a user other than root meets the file's mode: the test runs on as
-  // "nobody" (real and effective, as access() asks about the real one), root
-  // staying the saved user. False where root cannot be given up.
-  bool AsNobody() { return geteuid() != 0 || (nobody = setresuid(65534, 65534, 0) == 0); }
-  void AsRootAgain() { EXPECT_TRUE(!nobody || setresuid(0, 0, 0) == 0); }
+  // The rows in a closed file of |mode|. Only a user other than root meets
+  // it: the test goes on as "nobody" (real and effective, as access() asks
+  // about the real one), root the saved user. False where it cannot.
+  bool WithMode(mode_t mode) {
+    WriteRows(true);
+    EXPECT_EQ(0, chmod(DbPath().c_str(), mode));
+    return geteuid() != 0 || (nobody = setresuid(65534, 65534, 0) == 0);
+  }
 
   LauncherDataManager store;
   LauncherPackageManager packages;
@@ -222,20 +221,16 @@ TEST_F(StressTest, ReservedLockRefusesWritesOnlyAfterFiveImmediateRetries) {
 }
 
 TEST_F(StressTest, UnreadableFileLeavesTheStoreUnopenedAnsweringFailures) {
-  WriteRows(true);
-  ASSERT_EQ(0, chmod(DbPath().c_str(), 0));
-  if (!AsNobody()) GTEST_SKIP() << "cannot give up root here";
+  if (!WithMode(0)) GTEST_SKIP() << "cannot give up root here";
   EXPECT_TRUE(store.Initialize(packages));  // the ids are listed and nothing is stored
   EXPECT_EQ(nullptr, store.m_db);
   EveryOperationUnder(kBroken);
-  AsRootAgain();
+  EXPECT_TRUE(!nobody || setresuid(0, 0, 0) == 0);
   EXPECT_EQ(rows, SqlProbe(DbPath()).Layout());
 }
 
 TEST_F(StressTest, ReadOnlyFileIsReadAndRefusesEveryWrite) {
-  WriteRows(true);
-  ASSERT_EQ(0, chmod(DbPath().c_str(), 0444));
-  if (!AsNobody()) GTEST_SKIP() << "cannot give up root here";
+  if (!WithMode(0444)) GTEST_SKIP() << "cannot give up root here";
   store._OpenDb();
   EveryOperationUnder(kReadOnly);
   EXPECT_EQ(std::vector<std::string>{"E sqlite error : attempt to write a readonly database"},
