@@ -1,10 +1,9 @@
 #!/bin/sh
 # usage: example-from-install.sh CMAKE BUILD_DIR LIBDIR CXX EXAMPLE [FLAG...]
-# Installs the built tree into a temporary prefix, builds examples/host from
-# that prefix alone through pkg-config, with the FLAGs the tree was built with
-# (an instrumented library loads only into an instrumented program), and runs
-# it on a fresh simulated device, where it shows a first launch. In a cross
-# build KORRIN_RUN (the emulator) starts it and KORRIN_LDD lists dependencies.
+# Installs the build into a temporary prefix, builds examples/host from it
+# alone through pkg-config with the build's FLAGs, and runs it on a fresh
+# simulated device: a first launch. KORRIN_RUN (an emulator) starts it and
+# KORRIN_LDD lists dependencies in a cross build.
 set -eu
 cmake=$1 build=$2 libdir=$3 cxx=$4 example=$5
 shift 5

@@ -1,6 +1,5 @@
-// The demo as the README runs it: a fresh device, a story that ends well and
-// shows every step's home screen, and nothing of its own (the device root is
-// the user's path) wider than an 80-column terminal.
+// The demo as the README runs it ends well, shows every step, and nothing of
+// its own (the root is the user's path) is wider than an 80-column terminal.
 #include <stdio.h>
 #include <sys/wait.h>
 

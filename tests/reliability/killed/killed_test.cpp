@@ -1,9 +1,8 @@
-// The launcher killed in the middle of a write. Children of the test process
-// (each from the library as loaded) run the engine on nine games through the
-// file shim and die with SIGKILL before one file operation, each in turn;
-// the database left must check out, and the next start must take it as it
-// stands. The same statements make the same operations, so a failing kill
-// comes again at the same number.
+// The launcher killed in the middle of a write: forked children run the
+// engine on nine games through the file shim and die with SIGKILL before one
+// file operation, each in turn (the same statements make the same
+// operations); the database left must check out, and the next start must
+// take it as it stands.
 #include <signal.h>
 #include <sys/wait.h>
 #include <unistd.h>
@@ -32,16 +31,12 @@ long g_operations = 0;  // file operations the child made so far
 class KilledTest : public SimTest {
  protected:
   KilledTest() {
-    for (int i = 1; i <= 9; ++i) {
-      std::string id = "game" + std::to_string(i);
-      device.AddGame(id, id);
-    }
+    for (char id[] = "game1"; id[4] <= '9'; ++id[4]) device.AddGame(id, id);
   }
 
   // Runs |body| in a child that dies with SIGKILL before file operation
-  // |killAt| (never when 0). Returns the operations it made and what it
-  // logged, when it ran to the end. Syncs are counted but skipped: SIGKILL
-  // loses nothing that reached the kernel, and thousands of fsyncs take long.
+  // |killAt| (never when 0); the operations it made and its logs if it ended.
+  // Syncs are counted but skipped: SIGKILL loses nothing the kernel has.
   std::pair<long, Lines> Child(long killAt, const std::function<void()>& body) {
     const std::string report = root + "/child-report";
     fs::remove(report);
@@ -110,10 +105,9 @@ TEST_F(KilledTest, AFirstLaunchKilledAnywhereLeavesWhatTheNextStartTakesAsItStan
   }
 }
 
-// The uninstall deletes the game's box, then rewrites every other box of the
-// page from the first cell, each in a commit of its own, and nothing finishes
-// a killed sequence later: the page stays closed up to some box and as it was
-// after it.
+// The uninstall deletes the game's box, then rewrites every other box from
+// the first cell, each in a commit of its own, and nothing finishes a killed
+// sequence: the page stays closed up to some box and as it was after it.
 TEST_F(KilledTest, AnUninstallKilledWhileThePageClosesUpLeavesItClosedUpToABox) {
   Child(0, data_engin_initialization);
   const Layout laidOut = SqlProbe(DbPath()).Layout();

@@ -32,11 +32,10 @@ int g_sleeps = 0, g_refusedLocks = 0;
 void Waited() { g_sleeps += g_catching; }
 }  // namespace
 
-// The calls that wait for time. This binary exports them, so the dynamic
-// linker binds the library's, SQLite's and libstdc++'s calls to these; a
-// sleep returns at once, counted while catching. poll also serves file
-// descriptors, so it is passed on when not catching. Raw system calls are not
-// seen: qemu-user, where the ARM build's tests run, refuses seccomp filters.
+// The calls that wait for time, exported by this binary so that every library
+// binds to them: a sleep returns at once, counted while catching (poll also
+// serves file descriptors, and is passed on when not). Raw system calls are
+// not seen: qemu-user, where the ARM build's tests run, refuses seccomp.
 extern "C" {
 unsigned int sleep(unsigned int) { return Waited(), 0; }
 int usleep(useconds_t) { return Waited(), 0; }
@@ -81,9 +80,8 @@ TEST(SleepCatcherTest, SeesSqliteAndStandardSleeps) {
             }));
 }
 
-// Another process that takes the lock |sql| takes, with what it writes, and
-// commits as this object goes. Fork it only while this one holds no lock on
-// the file, or the child would inherit SQLite's record of it.
+// Another process holding the lock |sql| takes, with its writes, until it
+// commits as this object goes; made while this one holds no lock on the file.
 struct OtherProcess {
   OtherProcess(const std::string& path, const std::string& sql) {
     if (socketpair(AF_UNIX, SOCK_STREAM, 0, m_ends) != 0 || (m_pid = fork()) < 0) abort();
@@ -114,9 +112,8 @@ enum Condition { kExclusiveLock, kReservedLock, kBroken, kReadOnly, kFullDisk };
 
 class StressTest : public SimTest {
  protected:
-  // Menu 1 "Apps", its page 1 and boxes 1 "a" and 2 "b", in a file that
-  // anyone may reach, so that only its own mode refuses; the store stays
-  // open unless |close|.
+  // Menu 1 "Apps", its page 1 and boxes 1 "a" and 2 "b", in a file anyone
+  // may reach (only its own mode refuses); the store stays open unless |close|.
   void WriteRows(bool close = false) {
     EXPECT_EQ(SQLITE_OK, fileshim::Install([](fileshim::Op op, const std::function<int()>& run) {
                 int rc = run();
@@ -238,8 +235,8 @@ TEST_F(StressTest, ReadOnlyFileIsReadAndRefusesEveryWrite) {
   EXPECT_EQ(rows, SqlProbe(DbPath()).Layout());
 }
 
-// A file size limit, SIGXFSZ ignored, fails a write with EFBIG: SQLite's I/O
-// error, where a full disk's ENOSPC is SQLITE_FULL; the store treats both alike.
+// A file size limit fails a write with EFBIG, an I/O error to SQLite where a
+// full disk's ENOSPC is SQLITE_FULL; the store treats both alike.
 TEST_F(StressTest, FullDiskRefusesEveryWriteAndWritesAgainOnceFreed) {
   WriteRows();
   signal(SIGXFSZ, SIG_IGN);
