@@ -37,7 +37,8 @@ TEST(LoadedLikeALauncher, FirstLaunchThenEventsEvenAfterUninitialization) {
   // the one installed since stores its name.
   EXPECT_EQ((std::vector<Row>{{"Apps", "1", "Zoo 1,1", ""}, {"Apps", "1", "chess 2,1", ""},
                               {"Apps", "1", "chess2 3,1", ""}, {"Apps", "1", "mahjong 4,1", ""},
-                              {"Apps", "1", "tetra 1,2", ""}, {"Apps", "1", "arcade 2,2", "Arcade"}}),
+                              {"Apps", "1", "tetra 1,2", ""},
+                              {"Apps", "1", "arcade 2,2", "Arcade"}}),
             SqlProbe(device.HostPath("/opt/usr/apps/com.velmora.korrin/data/.game-data.db"))
                 .Rows("SELECT m.name, pageNo, appId || ' ' || col || ',' || row, IFNULL(b.name, "
                       "'') FROM Menus m, Pages p, Boxes b ON p.parentId = m.menuId AND b.pageId "

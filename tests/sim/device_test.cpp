@@ -6,9 +6,7 @@
 
 #include "support/sim-test.h"
 
-class DeviceTest : public SimTest {};
-
-TEST_F(DeviceTest, InjectedFailuresHoldOnceOrUntilClearedAndOnlyForKnownCalls) {
+TEST_F(SimTest, InjectedFailuresHoldOnceOrUntilClearedAndOnlyForKnownCalls) {
   device.AddGame("racer", "Racer");
   std::vector<int> results;
   auto open = [&] {

@@ -68,9 +68,8 @@ class KilledTest : public SimTest {
     return run;
   }
 
-  // Kills |body|, run on the database |from| (none when empty), before
-  // operation |killAt|, then starts the engine after |before|. Returns that
-  // start's logs and the layout after it, in a database that checks out.
+  // Kills |body| on the database |from| (none if empty) before operation
+  // |killAt|, starts the engine after |before|: its logs, and the layout.
   std::pair<Lines, Layout> KillAndRestart(const std::string& from, long killAt,
                                           const std::function<void()>& body,
                                           const std::function<void()>& before = [] {}) {

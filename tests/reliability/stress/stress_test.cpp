@@ -18,6 +18,7 @@
 #include <chrono>
 #include <fstream>
 #include <functional>
+#include <iterator>
 #include <thread>
 
 #include "launcher-data-manager/launcher-data-manager.h"
@@ -148,7 +149,8 @@ class StressTest : public SimTest {
       bool reads;
       int answers[5];  // by Condition
     } cases[] = {
-#define OP(call, reads, ...) {#call, [&] { return static_cast<int>(store.call); }, reads, __VA_ARGS__}
+#define OP(call, reads, ...) \
+  {#call, [&] { return static_cast<int>(store.call); }, reads, __VA_ARGS__}
         // Inserts do not look at their step: they answer this connection's
         // last row id, or the id the row would have had; updates succeed.
         OP(InsertBoxData(box), false, {0, 0, -1, 0, 3}),
@@ -190,14 +192,16 @@ class StressTest : public SimTest {
     EXPECT_EQ(3, store.InsertBoxData(box));
   }
 
-  // The rows in a closed file of |mode|. Only a user other than root meets
-  // it: the test goes on as "nobody" (real and effective, as access() asks
-  // about the real one), root the saved user. False where it cannot.
+  // The rows in a closed file of |mode|, which only a user other than root
+  // meets: "nobody" from here (real and effective, as access() asks about the
+  // real one), root the saved user. False where root cannot be given up.
   bool WithMode(mode_t mode) {
     WriteRows(true);
     EXPECT_EQ(0, chmod(DbPath().c_str(), mode));
     return geteuid() != 0 || (nobody = setresuid(65534, 65534, 0) == 0);
   }
+  void AsRootAgain() { nobody = nobody && setresuid(0, 0, 0) != 0; }
+  ~StressTest() override { AsRootAgain(); }  // the sanitizers' checks at exit need root
 
   LauncherDataManager store;
   LauncherPackageManager packages;
@@ -222,7 +226,7 @@ TEST_F(StressTest, UnreadableFileLeavesTheStoreUnopenedAnsweringFailures) {
   EXPECT_TRUE(store.Initialize(packages));  // the ids are listed and nothing is stored
   EXPECT_EQ(nullptr, store.m_db);
   EveryOperationUnder(kBroken);
-  EXPECT_TRUE(!nobody || setresuid(0, 0, 0) == 0);
+  AsRootAgain();
   EXPECT_EQ(rows, SqlProbe(DbPath()).Layout());
 }
 
@@ -258,8 +262,8 @@ TEST_F(StressTest, GarbageFileAnswersFailuresAndIsNeverOverwritten) {
   std::ofstream(DbPath(), std::ios::binary) << garbage;
   EXPECT_TRUE(store.Initialize(packages));
   EveryOperationUnder(kBroken);
-  std::string bytes(garbage.size() + 1, '\0');
-  EXPECT_EQ(garbage, bytes.substr(0, std::ifstream(DbPath()).read(&bytes[0], bytes.size()).gcount()));
+  std::ifstream file(DbPath(), std::ios::binary);
+  EXPECT_EQ(garbage, std::string(std::istreambuf_iterator<char>(file), {}));
 }
 
 }  // namespace

@@ -79,8 +79,7 @@ TEST_P(FaultSweep, TheEngineComesThroughWhole) {
   session.Execute("fail " + call + " -5" + (always ? " always" : " once"));
   Play();
   session.Execute("fail clear");
-  // The listener is registered only as the engine starts, as the launcher
-  // has it: a refused registration is mended by starting it again.
+  // The listener registers only as the engine starts: a new start mends it.
   if (call == "package_manager_set_event_cb") session.Execute("start");
   ExpectCameThroughWhole(kReleases.count(call) == 0 ? 0 : always ? device.CallCount(call) : 1);
 }
