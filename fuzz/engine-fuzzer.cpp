@@ -47,6 +47,14 @@ std::string Refused(std::string line) {
   return "";
 }
 
+// Runs |sql| on the engine's connection, or dies with SQLite's error.
+void Sql(const char* sql) {
+  sqlite3* db = korrin::DataManager().m_db;
+  if (sqlite3_exec(db, sql, NULL, NULL, NULL) != SQLITE_OK) {
+    Die(sql + (": " + std::string(sqlite3_errmsg(db))));
+  }
+}
+
 void EndInput(bool unwound) {
   sim::Device& device = sim::Device::Get();
   device.Reset();  // first, so that no fault or pending line reaches what follows
@@ -63,7 +71,10 @@ void EndInput(bool unwound) {
   tracker.m_pkgJobMap.clear();
   tracker.m_pkgJobList.clear();
   tracker.m_isMmcInserted = false;
-  // The engine's own callbacks, a connection opened afresh, jobs heard again.
+  // Texts travel only through bound parameters, so every table is still there
+  // (looked for before the connection is opened afresh, which would make them).
+  if (store.m_db != NULL) Sql("SELECT 1 FROM Boxes, Pages, Menus LIMIT 0");
+  // The engine's own callbacks, its connection, listening: as on a start.
   data_engin_initialization();
 
   std::map<std::string, int> open = device.OpenHandlesByKind();
@@ -73,13 +84,7 @@ void EndInput(bool unwound) {
     for (const auto& kind : open) text += " " + kind.first + "=" + std::to_string(kind.second);
     Die(text);
   }
-  // Texts travel only through bound parameters, so every table is still there to empty.
-  if (sqlite3_exec(store.m_db,
-                   "DELETE FROM Boxes; DELETE FROM Pages; DELETE FROM Menus; "
-                   "DELETE FROM sqlite_sequence;",
-                   NULL, NULL, NULL) != SQLITE_OK) {
-    Die(std::string("cannot empty the layout tables: ") + sqlite3_errmsg(store.m_db));
-  }
+  Sql("DELETE FROM Boxes; DELETE FROM Pages; DELETE FROM Menus; DELETE FROM sqlite_sequence");
   device.Reset();  // the logs and call counts of the clean-up
 }
 
