@@ -31,9 +31,9 @@ void Die(const std::string& message) {
   abort();
 }
 
-// Views of the stored layout read the database on their own connection and
-// tell nothing of the engine. A release made to fail would leave its handle
-// open for good. (Command names are never quoted; their arguments may be.)
+// Views of the stored layout tell nothing of the engine, and draw a hostile one
+// (a box at row 2^31, a folder inside itself) for ever. A release made to fail
+// leaves its handle open for good. (Command names are never quoted.)
 std::string Refused(std::string line) {
   std::istringstream words(line);
   for (std::string w; words >> w;) {
@@ -47,7 +47,6 @@ std::string Refused(std::string line) {
   return "";
 }
 
-// Runs |sql| on the engine's connection, or dies with SQLite's error.
 void Sql(const char* sql) {
   sqlite3* db = korrin::DataManager().m_db;
   if (sqlite3_exec(db, sql, NULL, NULL, NULL) != SQLITE_OK) {
@@ -91,8 +90,7 @@ void EndInput(bool unwound) {
 }  // namespace
 
 extern "C" int LLVMFuzzerInitialize(int*, char***) {
-  // On tmpfs when there is one: syncing every commit to a disk would take most
-  // of the time. (A crash leaves the root behind.)
+  // On tmpfs when there is one, as every commit syncs; a crash leaves it behind.
   std::string base = access("/dev/shm", W_OK) == 0 ? "/dev/shm" : "/tmp";
   g_root = base + "/korrin-fuzz-" + std::to_string(getpid());
   if (!sim::Device::Get().UseRoot(g_root)) Die("cannot make a device root");
