@@ -31,13 +31,13 @@ void Die(const std::string& message) {
   abort();
 }
 
-// Views of the stored layout tell nothing of the engine, and draw a hostile one
-// (a box at row 2^31, a folder inside itself) for ever. A release made to fail
-// leaves its handle open for good. (Command names are never quoted.)
+// Views tell nothing of the engine; layout and folder draw a hostile layout (a
+// box at row 2^31, a folder in itself) for ever, trace keeps SQL across inputs.
+// A release made to fail leaves its handle open for good. (Names are never quoted.)
 std::string Refused(std::string line) {
   std::istringstream words(line);
   for (std::string w; words >> w;) {
-    if (w == "layout" || w == "folder" || w == "tables") return "a view of the tables";
+    if (w == "layout" || w == "folder" || w == "tables" || w == "trace") return "a view";
   }
   line.erase(std::remove_if(line.begin(), line.end(), [](char c) { return strchr("\"'\\", c); }),
              line.end());
