@@ -11,7 +11,6 @@
 #include <unistd.h>
 
 #include <algorithm>
-#include <boost/program_options/errors.hpp>
 #include <filesystem>
 #include <sstream>
 
@@ -54,7 +53,7 @@ void Sql(const char* sql) {
   }
 }
 
-void EndInput(bool unwound) {
+void EndInput() {
   sim::Device& device = sim::Device::Get();
   device.Reset();  // first, so that no fault or pending line reaches what follows
   LauncherDataManager& store = korrin::DataManager();
@@ -77,7 +76,7 @@ void EndInput(bool unwound) {
   data_engin_initialization();
 
   std::map<std::string, int> open = device.OpenHandlesByKind();
-  if (g_handles.empty() || unwound) g_handles = open;  // see LLVMFuzzerTestOneInput
+  if (g_handles.empty()) g_handles = open;  // the first clean-up, before any input
   if (open != g_handles) {
     std::string text = "platform handles open after the input, not as before it:";
     for (const auto& kind : open) text += " " + kind.first + "=" + std::to_string(kind.second);
@@ -99,38 +98,25 @@ extern "C" int LLVMFuzzerInitialize(int*, char***) {
 
   // korrin-sim's usage-log client opens its handle on first use and keeps it.
   korrin_sim::Session().Execute("call InsertLog (null) (null) (null) (null) false");
-  EndInput(false);
+  EndInput();
   return 0;
 }
 
 extern "C" int LLVMFuzzerTestOneInput(const uint8_t* bytes, size_t size) {
-  korrin_sim::Session session(false);  // lives until EndInput has dropped its pending lines
+  korrin_sim::Session session(false, false);  // lives until EndInput drops its pending lines
   std::istringstream script(std::string(reinterpret_cast<const char*>(bytes), size));
-  bool armed = false, unwound = false;  // a `before` line waits; an error went up through engine
   std::string line;
   for (int n = 0; n < 200 && std::getline(script, line); ++n) {
     std::string note = Refused(line);
     try {
       if (note.empty()) session.Execute(line);
-      armed = armed || (note.empty() && line.find("before") != line.npos);
     } catch (const korrin_sim::UsageError& e) {
-      // A line that parses fails before changing anything, unless the error
-      // is a `before` line's, raised in a platform call: it went up through
-      // the engine's frames, which never expect one, leaving open what they held.
-      note = e.what();
-      try {
-        session.Check(line);
-        unwound = unwound || armed;
-      } catch (const korrin_sim::UsageError&) {
-      }
-    } catch (const boost::program_options::error& e) {  // a few escape as themselves
       note = e.what();
     } catch (const boost::bad_function_call& e) {  // an empty callback slot, as the launcher's
       note = e.what();
-      unwound = unwound || armed;
     }
     if (getenv("KORRIN_FUZZ_TRACE")) fprintf(stderr, "%s  # %s\n", line.c_str(), note.c_str());
   }
-  EndInput(unwound);
+  EndInput();
   return 0;
 }

@@ -3,6 +3,7 @@
 #include <algorithm>
 #include <iostream>
 #include <sstream>
+#include <utility>
 
 #include <boost/program_options.hpp>
 #include <dtl/dtl.hpp>
@@ -86,8 +87,8 @@ void Parse(const Command& command, const std::vector<std::string>& words,
   // Long options only, never abbreviated: "-5" is a number, "--lab" a mistake.
   int style = po::command_line_style::unix_style & ~po::command_line_style::allow_short &
               ~po::command_line_style::allow_guessing;
-  RefuseSpacedFlagValue(command, all, words);
   try {
+    RefuseSpacedFlagValue(command, all, words);
     po::store(po::command_line_parser(words).options(all).positional(order).style(style).run(),
               values);
     po::notify(values);
@@ -153,7 +154,8 @@ bool IsComment(const std::string& line) {
 
 }  // namespace
 
-Session::Session(bool printActions) : printActions_(printActions), logMark_(0) {}
+Session::Session(bool printActions, bool recordChanges)
+    : printActions_(printActions), recordChanges_(recordChanges), logMark_(0) {}
 
 std::string Session::DatabasePath() const { return korrin::DevicePath(korrin::kGameDataDbPath); }
 
@@ -180,7 +182,8 @@ void Session::Execute(const std::string& line) {
 
   Snapshot before;
   size_t logMark = sim::Device::Get().Logs().size();
-  if (command.action) before = TakeSnapshot(DatabasePath());
+  bool record = command.action && recordChanges_;
+  if (record) before = TakeSnapshot(DatabasePath());
   // A command may run inside another (see `before`): print where it prints.
   std::ostream& outer = Out();
   std::ostringstream output;
@@ -190,13 +193,15 @@ void Session::Execute(const std::string& line) {
     command.run(*this, Args(prepared.values, prepared.words, prepared.rest));
   } catch (...) {
     SetOut(&outer);
+    beforeError_ = nullptr;  // the command's own error is the one to tell
     throw;
   }
   SetOut(&outer);
+  if (beforeError_) std::rethrow_exception(std::exchange(beforeError_, nullptr));
   lastOutput_ = output.str();
   if (command.action) {
     before_ = before;
-    after_ = TakeSnapshot(DatabasePath());
+    if (record) after_ = TakeSnapshot(DatabasePath());
     logMark_ = logMark;
   }
   if (&outer != &std::cout) {
@@ -215,8 +220,12 @@ void Session::RunBefore(const std::string& call, const std::string& line) {
 void Session::ArmBefore(const std::string& call) {
   sim::Device::Get().BeforeNext(call, [this, call]() {
     std::string next = beforeCalls_[call].front();
-    Execute(next);
     beforeCalls_[call].pop_front();
+    try {
+      Execute(next);
+    } catch (...) {
+      if (!beforeError_) beforeError_ = std::current_exception();
+    }
     if (!beforeCalls_[call].empty()) ArmBefore(call);  // for the call after this one
   });
 }

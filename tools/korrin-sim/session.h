@@ -6,6 +6,7 @@
 #include <stddef.h>
 
 #include <deque>
+#include <exception>
 #include <istream>
 #include <map>
 #include <ostream>
@@ -24,7 +25,9 @@ class Session {
  public:
   // |printActions| false keeps what commands that change something print to
   // themselves (for `expect`), so that only views and `say` reach the screen.
-  explicit Session(bool printActions = true);
+  // |recordChanges| false spares the two reads of the whole database around
+  // each such command, for drivers that never show `changes`.
+  explicit Session(bool printActions = true, bool recordChanges = true);
 
   // Runs one command line (comments and blank lines do nothing). Throws
   // UsageError, having changed nothing, when it cannot run as written.
@@ -67,6 +70,10 @@ class Session {
   void ArmBefore(const std::string& call);
 
   bool printActions_;
+  bool recordChanges_;
+  // The error of a `before` line, raised inside a platform call: kept until
+  // the command around it returns, so that it never unwinds the engine.
+  std::exception_ptr beforeError_;
   std::string lastOutput_;  // what the last command printed
   size_t logMark_;          // first log line of the last action
   Snapshot before_;         // the database around the last action
