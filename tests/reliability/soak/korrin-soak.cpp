@@ -53,7 +53,7 @@ const int kOddStates[] = {4, 9, -1, -100};
 
 // One word of a command line, as korrin-sim splits it again.
 std::string Arg(const std::string& text) {
-  if (text.find_first_not_of("abcdefghijklmnopqrstuvwxyz0123456789.=") == std::string::npos) {
+  if (text.find_first_not_of("ABCDEFGHIJKLMNOPQRSTUVWXYZabcdefghijklmnopqrstuvwxyz0123456789.=") == std::string::npos) {
     return text;
   }
   std::string word = "\"";
@@ -77,11 +77,83 @@ class Generator {
  public:
   explicit Generator(uint32_t seed) : m_rng(seed) {}
 
-  // The command lines of the next step, which |model| takes in.
-  std::vector<std::string> Next(Model& model);
+  // The command lines of the next step, which |model| takes in. Package
+  // operations before the first start are heard by nobody.
+  std::vector<std::string> Next(Model& model) {
+    m_lines.clear();
+    const uint32_t installed = static_cast<uint32_t>(model.packages.size());
+    const size_t pages = model.pages.size();
+    const bool on = model.started;
+    const uint32_t weights[] = {
+        4 + 16 * (kPool - installed) / kPool,             // install
+        installed ? 22u : 0u,                             // update
+        installed ? 2 + 16 * installed / kPool : 0u,      // uninstall
+        16, 5,                                            // raw event, quiet change
+        model.paused ? 0u : 3u, model.paused ? 12u : 1u,  // pause; replay a dozen steps later
+        on ? 1u : 12u, on ? 2u : 0u,                      // start, boot-done
+        on && pages < 4 ? 1u : 0u, pages ? 3u : 0u,       // page, shortcut
+    };
+    uint32_t total = 0, what = 0;
+    for (uint32_t weight : weights) total += weight;
+    for (uint32_t draw = Below(total); draw >= weights[what]; ++what) draw -= weights[what];
+    std::string pkgId = Pool();
+    if (what == 0) {  // mostly a package the device lacks; now and then one installed again
+      for (int tries = 0; tries < 8 && model.packages.count(pkgId); ++tries) pkgId = Pool();
+      Send("install", NewPackage(pkgId), PACKAGE_MANAGER_EVENT_TYPE_INSTALL, model);
+    } else if (what == 1) {
+      Update(model);
+    } else if (what == 2) {
+      pkgId = Pick(model.packages).id;
+      Emit("uninstall " + Arg(pkgId));
+      model.Uninstall(pkgId);
+    } else if (what == 3) {
+      RawEvent(model);
+    } else if (what == 4) {
+      if (installed && OneIn(2)) {
+        pkgId = Pick(model.packages).id;
+        Emit("remove " + Arg(pkgId));
+        model.packages.erase(pkgId);
+      } else {
+        sim::Package pkg = Describe(NewPackage(pkgId), false, model);
+        model.packages[pkgId] = pkg;
+      }
+      Touch(pkgId);
+    } else if (what == 5) {
+      Emit("call PauseListenCb");
+      model.paused = true;
+    } else if (what == 6) {
+      Emit("call StartListenCb");
+      model.Listen();
+    } else if (what == 7 && !on && OneIn(2)) {  // installed once the games are listed
+      sim::Package pkg = Describe(NewPackage(pkgId), true, model);
+      Emit("before app_info_filter_destroy install " + Arg(pkgId));
+      Emit("start");
+      model.Start(&pkg);
+    } else if (what == 7) {
+      Emit("start");
+      model.Start(NULL);
+    } else if (what == 8) {
+      BootDone(model);
+    } else if (what == 9) {
+      int pageNo = 0;
+      for (const auto& page : model.pages) pageNo = std::max(pageNo, page.second);
+      Emit("call InsertPageData parentId=1 pageNo=" + std::to_string(pageNo + 1));
+      model.AddPage(pageNo + 1);
+    } else {
+      Shortcut(model);
+    }
+    return m_lines;
+  }
 
  private:
-  uint32_t Below(size_t n);  // uniform in [0, n)
+  uint32_t Below(size_t n) {  // uniform in [0, n): the short top range is rejected
+    const uint32_t bound = static_cast<uint32_t>(n), reject = -bound % bound;
+    uint32_t draw;
+    do {
+      draw = static_cast<uint32_t>(m_rng());
+    } while (draw < reject);
+    return draw % bound;
+  }
   bool OneIn(uint32_t n) { return Below(n) == 0; }
   template <typename Map>
   const typename Map::mapped_type& Pick(const Map& map) {
@@ -93,279 +165,178 @@ class Generator {
     if (m_recent.size() == 6) m_recent.erase(m_recent.begin());
     m_recent.push_back(pkgId);
   }
-
   std::string Pool() {
     uint32_t i = Below(kPool);
     return i == kPool - 2 ? "p'q" : i == kPool - 1 ? "p\xc3\xa9" : "p" + std::to_string(i);
   }
-  std::optional<std::string> Label();
-  sim::Package NewPackage(const std::string& pkgId);
-  sim::App NewApp(const std::string& pkgId, char letter);
-  sim::Package Describe(const sim::Package& pkg, bool held, const Model& model);
-  void Update(Model& model);
-  void RawEvent(Model& model);
-  void BootDone(const Model& model);
-  void Shortcut(Model& model);
+  std::optional<std::string> Label() {
+    if (OneIn(20)) return std::nullopt;
+    std::string label = kLabels[Below(sizeof kLabels / sizeof kLabels[0])];
+    return OneIn(2) ? label + " " + std::to_string(Below(10)) : label;
+  }
+
+  // On korrin-sim's new application, so that what `app` does not set agrees.
+  sim::App NewApp(const std::string& pkgId, char letter) {
+    sim::App app = sim::PlainApp(pkgId + "." + letter, pkgId + "." + letter);
+    app.label = Label();
+    app.game = !OneIn(4);
+    app.noDisplay = OneIn(10);
+    app.enabled = !OneIn(12);
+    if (OneIn(12)) app.component = PACKAGE_INFO_SERVICEAPP;
+    return app;
+  }
+  // Mostly one game; now and then another application alone, or several
+  // applications of every kind together.
+  sim::Package NewPackage(const std::string& pkgId) {
+    sim::Package pkg = sim::MakePackage(pkgId, {});
+    uint32_t shape = Below(10);
+    for (uint32_t i = 0, count = shape < 7 ? 1 : 2 + Below(3); i < count; ++i) {
+      pkg.apps.push_back(NewApp(pkgId, static_cast<char>('a' + i)));
+      if (shape < 7) pkg.apps.back().game = shape < 6;
+    }
+    pkg.preload = OneIn(8);
+    pkg.system = OneIn(10);
+    pkg.supportDisable = OneIn(4);
+    pkg.disabled = pkg.supportDisable && OneIn(10);
+    return pkg;
+  }
+
+  // Emits the `package` and `app` lines that describe |pkg| (|held|: for an
+  // install or update to send). korrin-sim builds on the installed package of
+  // that id, or on an empty one, and keeps the applications |pkg| leaves out:
+  // returns the package so described.
+  sim::Package Describe(const sim::Package& pkg, bool held, const Model& model) {
+    auto found = model.packages.find(pkg.id);
+    sim::Package was = found != model.packages.end() ? found->second : sim::MakePackage(pkg.id, {});
+    std::string flags = Flag("preload", was.preload, pkg.preload) +
+                        Flag("system", was.system, pkg.system) +
+                        Flag("support-disable", was.supportDisable, pkg.supportDisable) +
+                        Flag("disabled", was.disabled, pkg.disabled);
+    if (held || !flags.empty()) Emit("package " + Arg(pkg.id) + (held ? " --held" : "") + flags);
+    sim::Package described = pkg;
+    described.apps = was.apps;
+    for (const sim::App& app : pkg.apps) {
+      auto to = std::find_if(described.apps.begin(), described.apps.end(),
+                             [&](const sim::App& a) { return a.id == app.id; });
+      bool added = to == described.apps.end();
+      if (added) to = described.apps.insert(to, sim::PlainApp(app.id, app.id));
+      std::string options = Flag("game", to->game, app.game) +
+                            Flag("no-display", to->noDisplay, app.noDisplay) +
+                            Flag("enabled", to->enabled, app.enabled);
+      if (app.label != to->label) options += app.label ? " --label " + Arg(*app.label) : " --no-label";
+      if (app.component != to->component) {
+        options += app.component == PACKAGE_INFO_SERVICEAPP ? " --component service" : " --component ui";
+      }
+      if (added || !options.empty()) Emit("app " + Arg(pkg.id) + " " + Arg(app.id) + options);
+      *to = app;
+    }
+    return described;
+  }
+  void Send(const char* verb, const sim::Package& pkg, int type, Model& model) {
+    sim::Package sent = Describe(pkg, true, model);
+    Emit(verb + (" " + Arg(pkg.id)));
+    model.Install(sent, type);
+  }
+
+  // One change to an installed package, or now and then a package of new
+  // contents, which may not be installed yet.
+  void Update(Model& model) {
+    sim::Package pkg = OneIn(12) ? NewPackage(Pool()) : Pick(model.packages);
+    sim::App& app = pkg.apps[Below(pkg.apps.size())];
+    switch (Below(16)) {
+      case 0: case 1: case 2: case 3: case 4: app.label = Label(); break;
+      case 5: case 6: app.enabled = !app.enabled; break;
+      case 7: pkg.supportDisable = pkg.disabled = true; break;
+      case 8: pkg.disabled = false; break;
+      case 9: case 10: app.noDisplay = !app.noDisplay; break;
+      case 11: app.game = !app.game; break;
+      case 12:
+        if (pkg.apps.size() < 4) pkg.apps.push_back(NewApp(pkg.id, static_cast<char>('a' + pkg.apps.size())));
+        break;
+      case 13:
+        pkg.preload = !pkg.preload;
+        pkg.system = OneIn(3) != pkg.system;
+        break;
+    }
+    Send("update", pkg, PACKAGE_MANAGER_EVENT_TYPE_UPDATE, model);
+  }
+
+  // Favours pending packages and those touched lately, so that one package
+  // sees whole sequences (a quiet add, STARTED, FAILED, a late COMPLETED).
+  void RawEvent(Model& model) {
+    std::string pkgId;
+    uint32_t whose = Below(10);
+    if (whose < 4 && !model.jobs.empty()) {
+      pkgId = Pick(model.jobs).pkgId;
+    } else if (whose < 8 && !m_recent.empty()) {
+      pkgId = m_recent[Below(m_recent.size())];
+    } else {
+      pkgId = Pool();
+    }
+    Touch(pkgId);
+    uint32_t type = Below(8), state = Below(50);
+    int eventType = type < 7 ? static_cast<int>(type % 3) : kOddTypes[Below(4)];
+    int eventState = state < 20   ? PACKAGE_MANAGER_EVENT_STATE_STARTED
+                     : state < 35 ? PACKAGE_MANAGER_EVENT_STATE_COMPLETED
+                     : state < 40 ? PACKAGE_MANAGER_EVENT_STATE_FAILED
+                     : state < 44 ? PACKAGE_MANAGER_EVENT_STATE_PROCESSING
+                                  : kOddStates[Below(4)];
+    Emit("event " + Named(korrin_sim::kEventTypeNames, eventType) + " " +
+         Named(korrin_sim::kEventStateNames, eventState) + " " + Arg(pkgId));
+    model.Event(pkgId, eventType, eventState);
+  }
+
+  // The layout does not change: games on the card are only read again.
+  void BootDone(const Model& model) {
+    if (!OneIn(4)) Emit("call _RegisterEdbusSignalHandler");  // the signal ends it
+    Emit(OneIn(2) ? "card in" : "card out");
+    std::string onCard;
+    for (uint32_t n = Below(4); n > 0 && !model.packages.empty(); --n) {
+      const sim::Package& pkg = Pick(model.packages);
+      onCard += " " + Arg(pkg.apps[Below(pkg.apps.size())].id);
+    }
+    if (!onCard.empty()) Emit("on-card" + onCard);
+    Emit("boot-done");
+  }
+
+  // A shortcut of an application on the device or gone from it, on any page
+  // of menu 1, in a free cell up to a row below the last: the launcher may
+  // leave cells free, and new boxes must still follow the last one.
+  void Shortcut(Model& model) {
+    std::string appId = Pool() + ".a";
+    if (!model.packages.empty() && !OneIn(4)) {
+      const sim::Package& pkg = Pick(model.packages);
+      appId = pkg.apps[Below(pkg.apps.size())].id;
+    }
+    soak::Box box{std::next(model.pages.begin(), Below(model.pages.size()))->first, 0, 0, appId,
+                  Label().value_or(""), false, false, 3, static_cast<int>(Below(3)),
+                  OneIn(4) ? "" : "/opt/usr/share/icons/shortcut-" + std::to_string(Below(9)) + ".png",
+                  OneIn(3) ? "" : "launch?mode=" + std::to_string(Below(9))};
+    std::set<std::pair<int, int> > taken;
+    int rows = 1;
+    for (const auto& b : model.boxes) {
+      if (b.second.pageId != box.pageId) continue;
+      taken.insert({b.second.col, b.second.row});
+      rows = std::max(rows, b.second.row + 1);
+    }
+    do {
+      box.col = 1 + static_cast<int>(Below(4));
+      box.row = 1 + static_cast<int>(Below(rows));
+    } while (taken.count({box.col, box.row}));
+    std::string line = "call InsertBoxData boxType=3 pageId=" + std::to_string(box.pageId) +
+                       " col=" + std::to_string(box.col) + " row=" + std::to_string(box.row) +
+                       " launchType=" + std::to_string(box.launchType) + " " + Arg("appId=" + appId);
+    if (!box.name.empty()) line += " " + Arg("name=" + box.name);
+    if (!box.iconPath.empty()) line += " " + Arg("iconPath=" + box.iconPath);
+    if (!box.content.empty()) line += " " + Arg("content=" + box.content);
+    Emit(line);
+    model.AddBox(box);
+  }
 
   std::mt19937 m_rng;
-  int m_setup = -1;  // quiet steps left before the start
-  // Packages that raw events and quiet changes touched lately: further raw
-  // events favour them, so that one package sees whole sequences (a quiet
-  // add, STARTED, FAILED, a late COMPLETED) rather than lone events.
-  std::vector<std::string> m_recent;
-  std::vector<std::string> m_lines;  // of the step being drawn
+  std::vector<std::string> m_recent;  // packages raw events and quiet changes touched lately
+  std::vector<std::string> m_lines;   // of the step being drawn
 };
-
-// Rejection of the short top range keeps every value equally likely.
-uint32_t Generator::Below(size_t n) {
-  const uint32_t bound = static_cast<uint32_t>(n), reject = -bound % bound;  // 2^32 mod n
-  uint32_t draw;
-  do {
-    draw = static_cast<uint32_t>(m_rng());
-  } while (draw < reject);
-  return draw % bound;
-}
-
-std::vector<std::string> Generator::Next(Model& model) {
-  m_lines.clear();
-  if (!model.started) {  // a dozen quiet steps at most, then the first start
-    if (m_setup < 0) m_setup = static_cast<int>(Below(13));
-    if (m_setup-- > 0) {
-      if (OneIn(4)) {
-        RawEvent(model);
-      } else {
-        model.Put(Describe(NewPackage(Pool()), false, model));
-      }
-    } else if (OneIn(2)) {  // installed right after the engine has listed the games
-      sim::Package pkg = Describe(NewPackage(Pool()), true, model);
-      Emit("before app_info_filter_destroy install " + Arg(pkg.id));
-      Emit("start");
-      model.Start(&pkg);
-    } else {
-      Emit("start");
-      model.Start(NULL);
-    }
-    return m_lines;
-  }
-  const uint32_t installed = static_cast<uint32_t>(model.packages.size());
-  const size_t pages = model.pages.size();
-  const uint32_t weights[] = {
-      4 + 16 * (kPool - installed) / kPool,             // install
-      installed ? 22u : 0u,                             // update
-      installed ? 2 + 16 * installed / kPool : 0u,      // uninstall
-      16, 5,                                            // raw event, quiet change
-      model.paused ? 0u : 3u, model.paused ? 12u : 1u,  // pause, and replay about a dozen later
-      2, 1, pages < 4 ? 1u : 0u, pages ? 3u : 0u,       // boot-done, restart, page, shortcut
-  };
-  uint32_t total = 0, what = 0;
-  for (uint32_t weight : weights) total += weight;
-  for (uint32_t draw = Below(total); draw >= weights[what]; ++what) draw -= weights[what];
-  std::string pkgId = Pool();
-  switch (what) {
-    case 0: {  // mostly a package the device lacks; now and then one installed again
-      for (int tries = 0; tries < 8 && model.packages.count(pkgId); ++tries) pkgId = Pool();
-      sim::Package pkg = Describe(NewPackage(pkgId), true, model);
-      Emit("install " + Arg(pkgId));
-      model.Install(pkg, PACKAGE_MANAGER_EVENT_TYPE_INSTALL);
-      break;
-    }
-    case 1: Update(model); break;
-    case 2:
-      pkgId = Pick(model.packages).id;
-      Emit("uninstall " + Arg(pkgId));
-      model.Uninstall(pkgId);
-      break;
-    case 3: RawEvent(model); break;
-    case 4:
-      if (installed && OneIn(2)) {
-        pkgId = Pick(model.packages).id;
-        Emit("remove " + Arg(pkgId));
-        model.Remove(pkgId);
-      } else {
-        model.Put(Describe(NewPackage(pkgId), false, model));
-      }
-      Touch(pkgId);
-      break;
-    case 5: Emit("call PauseListenCb"); model.Pause(); break;
-    case 6: Emit("call StartListenCb"); model.Listen(); break;
-    case 7: BootDone(model); break;
-    case 8: Emit("start"); model.Start(NULL); break;
-    case 9: {
-      int pageNo = pages ? std::max_element(model.pages.begin(), model.pages.end(),
-                                            [](const std::pair<const int, int>& a,
-                                               const std::pair<const int, int>& b) {
-                                              return a.second < b.second;
-                                            })->second + 1 : 1;
-      Emit("call InsertPageData parentId=1 pageNo=" + std::to_string(pageNo));
-      model.AddPage(pageNo);
-      break;
-    }
-    default: Shortcut(model); break;
-  }
-  return m_lines;
-}
-
-std::optional<std::string> Generator::Label() {
-  if (OneIn(20)) return std::nullopt;
-  std::string label = kLabels[Below(sizeof kLabels / sizeof kLabels[0])];
-  return OneIn(2) ? label + " " + std::to_string(Below(10)) : label;
-}
-
-// Mostly one game; now and then another application alone, or several
-// applications of every kind together.
-sim::Package Generator::NewPackage(const std::string& pkgId) {
-  sim::Package pkg = sim::MakePackage(pkgId, {});
-  uint32_t shape = Below(10);
-  for (uint32_t i = 0, count = shape < 7 ? 1 : 2 + Below(3); i < count; ++i) {
-    pkg.apps.push_back(NewApp(pkgId, static_cast<char>('a' + i)));
-    if (shape < 7) pkg.apps.back().game = shape < 6;
-  }
-  pkg.preload = OneIn(8);
-  pkg.system = OneIn(10);
-  pkg.supportDisable = OneIn(4);
-  pkg.disabled = pkg.supportDisable && OneIn(10);
-  return pkg;
-}
-
-// On korrin-sim's new application, so that what `app` does not set agrees.
-sim::App Generator::NewApp(const std::string& pkgId, char letter) {
-  sim::App app = sim::PlainApp(pkgId + "." + letter, pkgId + "." + letter);
-  app.label = Label();
-  app.game = !OneIn(4);
-  app.noDisplay = OneIn(10);
-  app.enabled = !OneIn(12);
-  if (OneIn(12)) app.component = PACKAGE_INFO_SERVICEAPP;
-  return app;
-}
-
-// Emits the `package` and `app` lines that describe |pkg| (|held|: for an
-// install or update to send). korrin-sim builds on the installed package of
-// that id, or on an empty one, and keeps the applications |pkg| leaves out:
-// returns the package so described.
-sim::Package Generator::Describe(const sim::Package& pkg, bool held, const Model& model) {
-  auto found = model.packages.find(pkg.id);
-  sim::Package was = found != model.packages.end() ? found->second : sim::MakePackage(pkg.id, {});
-  std::string flags = Flag("preload", was.preload, pkg.preload) +
-                      Flag("system", was.system, pkg.system) +
-                      Flag("support-disable", was.supportDisable, pkg.supportDisable) +
-                      Flag("disabled", was.disabled, pkg.disabled);
-  if (held || !flags.empty()) Emit("package " + Arg(pkg.id) + (held ? " --held" : "") + flags);
-  sim::Package described = pkg;
-  described.apps = was.apps;
-  for (const sim::App& app : pkg.apps) {
-    auto to = std::find_if(described.apps.begin(), described.apps.end(),
-                           [&](const sim::App& a) { return a.id == app.id; });
-    bool added = to == described.apps.end();
-    if (added) to = described.apps.insert(to, sim::PlainApp(app.id, app.id));
-    std::string options = Flag("game", to->game, app.game) +
-                          Flag("no-display", to->noDisplay, app.noDisplay) +
-                          Flag("enabled", to->enabled, app.enabled);
-    if (app.label != to->label) options += app.label ? " --label " + Arg(*app.label) : " --no-label";
-    if (app.component != to->component) {
-      options += app.component == PACKAGE_INFO_SERVICEAPP ? " --component service" : " --component ui";
-    }
-    if (added || !options.empty()) Emit("app " + Arg(pkg.id) + " " + Arg(app.id) + options);
-    *to = app;
-  }
-  return described;
-}
-
-// One change to an installed package, or now and then a package of new
-// contents, which may not be installed yet.
-void Generator::Update(Model& model) {
-  sim::Package pkg = OneIn(12) ? NewPackage(Pool()) : Pick(model.packages);
-  sim::App& app = pkg.apps[Below(pkg.apps.size())];
-  switch (Below(16)) {
-    case 0: case 1: case 2: case 3: case 4: app.label = Label(); break;
-    case 5: app.enabled = false; break;
-    case 6: app.enabled = true; break;
-    case 7: pkg.supportDisable = pkg.disabled = true; break;
-    case 8: pkg.disabled = false; break;
-    case 9: app.noDisplay = true; break;
-    case 10: app.noDisplay = false; break;
-    case 11: app.game = !app.game; break;
-    case 12:
-      if (pkg.apps.size() < 4) pkg.apps.push_back(NewApp(pkg.id, static_cast<char>('a' + pkg.apps.size())));
-      break;
-    case 13:
-      pkg.preload = !pkg.preload;
-      pkg.system = OneIn(3) != pkg.system;
-      break;
-  }
-  sim::Package sent = Describe(pkg, true, model);
-  Emit("update " + Arg(pkg.id));
-  model.Install(sent, PACKAGE_MANAGER_EVENT_TYPE_UPDATE);
-}
-
-void Generator::RawEvent(Model& model) {
-  std::string pkgId;
-  uint32_t whose = Below(10);
-  if (whose < 4 && !model.jobs.empty()) {
-    pkgId = Pick(model.jobs).pkgId;
-  } else if (whose < 8 && !m_recent.empty()) {
-    pkgId = m_recent[Below(m_recent.size())];
-  } else {
-    pkgId = Pool();
-  }
-  Touch(pkgId);
-  uint32_t type = Below(8), state = Below(50);
-  int eventType = type < 7 ? static_cast<int>(type % 3) : kOddTypes[Below(4)];
-  int eventState = state < 20   ? PACKAGE_MANAGER_EVENT_STATE_STARTED
-                   : state < 35 ? PACKAGE_MANAGER_EVENT_STATE_COMPLETED
-                   : state < 40 ? PACKAGE_MANAGER_EVENT_STATE_FAILED
-                   : state < 44 ? PACKAGE_MANAGER_EVENT_STATE_PROCESSING
-                                : kOddStates[Below(4)];
-  Emit("event " + Named(korrin_sim::kEventTypeNames, eventType) + " " +
-       Named(korrin_sim::kEventStateNames, eventState) + " " + Arg(pkgId));
-  model.Event(pkgId, eventType, eventState);
-}
-
-// The layout does not change: games on the card are only read again.
-void Generator::BootDone(const Model& model) {
-  if (!OneIn(4)) Emit("call _RegisterEdbusSignalHandler");  // the signal ends it
-  Emit(OneIn(2) ? "card in" : "card out");
-  std::string onCard;
-  for (uint32_t n = Below(4); n > 0 && !model.packages.empty(); --n) {
-    const sim::Package& pkg = Pick(model.packages);
-    if (!pkg.apps.empty()) onCard += " " + Arg(pkg.apps[Below(pkg.apps.size())].id);
-  }
-  if (!onCard.empty()) Emit("on-card" + onCard);
-  Emit("boot-done");
-}
-
-// A shortcut of an application on the device or gone from it, on any page
-// of menu 1, in a free cell up to a row below the last: the launcher may
-// leave cells free, and new boxes must still follow the last one.
-void Generator::Shortcut(Model& model) {
-  std::string appId = Pool() + ".a";
-  if (!model.packages.empty() && !OneIn(4)) {
-    const sim::Package& pkg = Pick(model.packages);
-    appId = pkg.apps.empty() ? pkg.id + ".a" : pkg.apps[Below(pkg.apps.size())].id;
-  }
-  soak::Box box{std::next(model.pages.begin(), Below(model.pages.size()))->first, 0, 0, appId,
-                Label().value_or(""), false, false, 3, static_cast<int>(Below(3)),
-                OneIn(4) ? "" : "/opt/usr/share/icons/shortcut-" + std::to_string(Below(9)) + ".png",
-                OneIn(3) ? "" : "launch?mode=" + std::to_string(Below(9))};
-  std::set<std::pair<int, int> > taken;
-  int rows = 1;
-  for (const auto& b : model.boxes) {
-    if (b.second.pageId != box.pageId) continue;
-    taken.insert({b.second.col, b.second.row});
-    rows = std::max(rows, b.second.row + 1);
-  }
-  do {
-    box.col = 1 + static_cast<int>(Below(4));
-    box.row = 1 + static_cast<int>(Below(rows));
-  } while (taken.count({box.col, box.row}));
-  std::string line = "call InsertBoxData boxType=3 pageId=" + std::to_string(box.pageId) +
-                     " col=" + std::to_string(box.col) + " row=" + std::to_string(box.row) +
-                     " launchType=" + std::to_string(box.launchType) + " " + Arg("appId=" + appId);
-  if (!box.name.empty()) line += " " + Arg("name=" + box.name);
-  if (!box.iconPath.empty()) line += " " + Arg("iconPath=" + box.iconPath);
-  if (!box.content.empty()) line += " " + Arg("content=" + box.content);
-  Emit(line);
-  model.AddBox(box);
-}
 
 // ---- The run.
 
@@ -404,7 +375,6 @@ struct Options {
   uint32_t seed;
   uint64_t events, tamperAt;
   std::string root;
-  bool trace;
 };
 
 int Soak(const Options& options) {
@@ -436,7 +406,6 @@ int Soak(const Options& options) {
   for (uint64_t k = 1; k <= options.events; ++k) {
     device.ClearLogs();  // the device keeps every line otherwise
     for (const std::string& line : generator.Next(model)) {
-      if (options.trace) std::cout << line << std::endl;
       try {
         session.Execute(line);
       } catch (const std::exception& e) {
@@ -499,7 +468,6 @@ int main(int argc, char** argv) {
       ("root", po::value<std::string>(&options.root)->value_name("DIR"),
        "keep the device and its database in DIR, replacing a database left there "
        "(default: a temporary folder, removed unless the run fails)")
-      ("trace", po::bool_switch(&options.trace), "print each command line as it is played")
       ("tamper-at", po::value<uint64_t>(&options.tamperAt)->default_value(0)->value_name("K"),
        "self-test: change the database behind the engine's back after step K")
       ("help", "show these options");
