@@ -1,5 +1,5 @@
 // The soak's model: what the device holds, the package jobs the engine keeps,
-// and the layout the engine must have stored after each step. It is written
+// and the tables the engine must have stored after each step. It is written
 // from the engine's described behaviour and shares no code with it, so that a
 // difference between the two is a finding in one or the other.
 #ifndef KORRIN_TESTS_SOAK_MODEL_H_
@@ -7,7 +7,6 @@
 
 #include <package_manager.h>
 
-#include <algorithm>
 #include <map>
 #include <set>
 #include <string>
@@ -30,8 +29,6 @@ struct Box {
 
 class Model {
  public:
-  // ---- The steps, as the device and the launcher make them.
-
   // An install or update: the device's STARTED, the package, COMPLETED.
   void Install(const sim::Package& pkg, int type) {
     Event(pkg.id, type, PACKAGE_MANAGER_EVENT_STATE_STARTED);
@@ -44,8 +41,8 @@ class Model {
     Event(pkgId, PACKAGE_MANAGER_EVENT_TYPE_UNINSTALL, PACKAGE_MANAGER_EVENT_STATE_COMPLETED);
   }
   // A start replaces the package's pending job; an uninstall names its
-  // applications there, while they can still be read. A completion without
-  // a start, PROCESSING and unknown states change nothing.
+  // applications there, while they can still be read. A completion without a
+  // start, PROCESSING and unknown states change nothing.
   void Event(const std::string& pkgId, int type, int state) {
     if (!started) return;  // nobody listens yet
     if (state == PACKAGE_MANAGER_EVENT_STATE_STARTED) {
@@ -60,8 +57,8 @@ class Model {
     }
   }
   // Listening pauses while the store is filled. The first time, every
-  // displayable, enabled game, any kind of application, is laid out in byte
-  // order of id, four to a row on page 1, its box holding only the id; then
+  // displayable, enabled game (of any component) is laid out by id, byte
+  // order, four to a row on page 1, its box holding only the id; then
   // |meanwhile| (unless null) is installed.
   void Start(const sim::Package* meanwhile) {
     paused = true;
@@ -73,11 +70,10 @@ class Model {
         }
       }
     }
-    int i = 0;
+    if (!games.empty()) pages = 1;
     for (const std::string& appId : games) {
-      if (i == 0) AddPage(1);
-      AddBox(Box{nextPageId - 1, i % 4 + 1, i / 4 + 1, appId, "", false, false, 0, 0, "", ""});
-      ++i;
+      int i = static_cast<int>(boxes.size());
+      boxes[nextBoxId++] = Box{1, i % 4 + 1, i / 4 + 1, appId, "", 0, 0, 0, 0, "", ""};
     }
     started = true;
     if (meanwhile) Install(*meanwhile, PACKAGE_MANAGER_EVENT_TYPE_INSTALL);
@@ -90,7 +86,6 @@ class Model {
     run.swap(held);
     for (const Job& job : run) Run(job);
   }
-  void AddPage(int pageNo) { pages[nextPageId++] = pageNo; }
   void AddBox(const Box& box) { boxes[nextBoxId++] = box; }
 
   // The tables as the engine must have stored them; none before the start.
@@ -100,9 +95,8 @@ class Model {
     auto n = [](int value) { return std::to_string(value); };
     auto text = [](const std::string& t) { return t.empty() ? "NULL" : korrin_sim::Quote(t); };
     s.tables["Menus"] = {{"menuId", "name", "type"}, {{1, {"1", "\"Apps\"", "0"}}}};
-    korrin_sim::Snapshot::Table& p = s.tables["Pages"];
-    p.columns = {"pageId", "isFolder", "parentId", "pageNo"};
-    for (const auto& page : pages) p.rows[page.first] = {n(page.first), "0", "1", n(page.second)};
+    s.tables["Pages"].columns = {"pageId", "isFolder", "parentId", "pageNo"};
+    for (int id = 1; id <= pages; ++id) s.tables["Pages"].rows[id] = {n(id), "0", "1", n(id)};
     korrin_sim::Snapshot::Table& b = s.tables["Boxes"];
     b.columns = {"boxId", "isFolder", "pageParentId", "pageId", "appId", "name", "col",
                  "row", "isPreload", "isSystem", "boxType", "launchType", "iconPath", "content"};
@@ -124,7 +118,9 @@ class Model {
   std::map<std::string, sim::Package> packages;  // on the device
   bool started = false, paused = false;
   std::map<std::string, Job> jobs;  // started, by package
-  std::map<int, int> pages;         // menu 1's: pageId -> pageNo
+  // Menu 1's pages: the stream adds them in number order and none goes, so
+  // page k has pageId k and pageNo k.
+  int pages = 0;
   std::map<int, Box> boxes;
 
  private:
@@ -143,9 +139,10 @@ class Model {
   }
 
   // A job reads the device as it is when it runs: for a held job, at the
-  // replay. A new game gets a box with its label and flags; an update also
-  // rewrites those of a placed one, or takes it away when it disables it. A
-  // missing label keeps the name.
+  // replay. A new game gets a box after the last box of the last page (never
+  // in a free cell) with its label and flags; an update also rewrites those
+  // of a placed one, or takes it away when it disables it. A missing label
+  // keeps the name.
   void Run(const Job& job) {
     bool update = job.type == PACKAGE_MANAGER_EVENT_TYPE_UPDATE;
     if (job.type == PACKAGE_MANAGER_EVENT_TYPE_UNINSTALL) {
@@ -155,14 +152,22 @@ class Model {
         const sim::Package& pkg = packages.at(job.pkgId);
         bool enabled = app.enabled && !pkg.disabled;
         if (!enabled && update) Uninstalled(app.id);
-        auto placed = std::find_if(boxes.begin(), boxes.end(), [&](const std::pair<const int, Box>& b) {
-          return b.second.appId == app.id && b.second.boxType != 3;
-        });
-        if (!enabled || (placed != boxes.end() && !update)) continue;
-        Box& box = placed != boxes.end() ? placed->second : Place(app.id);
-        if (app.label) box.name = *app.label;
-        box.preload = pkg.preload;
-        box.system = pkg.system;
+        Box* box = NULL;
+        std::pair<int, int> last(1, 0);  // (row, col) on the last page: before its first cell
+        for (auto& b : boxes) {
+          if (b.second.appId == app.id && b.second.boxType != 3) box = &b.second;
+          if (b.second.pageId == pages) last = std::max(last, {b.second.row, b.second.col});
+        }
+        if (!enabled || (box && !update)) continue;
+        if (!box) {
+          if (++last.second > 4) last = {last.first + 1, 1};
+          pages = std::max(pages, 1);  // a first page when the menu has none
+          box = &(boxes[nextBoxId++] =
+                      Box{pages, last.second, last.first, app.id, "", 0, 0, 0, 0, "", ""});
+        }
+        if (app.label) box->name = *app.label;
+        box->preload = pkg.preload;
+        box->system = pkg.system;
       }
     }
   }
@@ -188,25 +193,8 @@ class Model {
     }
   }
 
-  // A new box goes after the last box of the last page of menu 1, on a first
-  // page when there is none; never into a free cell.
-  Box& Place(const std::string& appId) {
-    if (pages.empty()) AddPage(1);
-    int last = std::max_element(pages.begin(), pages.end(), [](const std::pair<const int, int>& a,
-                                                                const std::pair<const int, int>& b) {
-                 return a.second < b.second;
-               })->first;
-    std::pair<int, int> cell(1, 0);  // (row, col): before the first cell
-    for (const auto& b : boxes) {
-      if (b.second.pageId == last) cell = std::max(cell, {b.second.row, b.second.col});
-    }
-    if (++cell.second > 4) cell = {cell.first + 1, 1};
-    AddBox(Box{last, cell.second, cell.first, appId, "", false, false, 0, 0, "", ""});
-    return boxes.rbegin()->second;
-  }
-
   std::vector<Job> held;  // completed while paused
-  int nextPageId = 1, nextBoxId = 1;
+  int nextBoxId = 1;
 };
 
 }  // namespace soak
