@@ -1,8 +1,8 @@
 // korrin-soak: a seeded random stream of korrin-sim command lines (package
 // operations, raw events, quiet changes of the device, pause and replay,
 // boot-done, restarts, the launcher's own pages and shortcuts) played through
-// korrin-sim's session, the stored tables compared after every step with the
-// model's, and every platform handle a step opens given back.
+// korrin-sim's session; after every step the stored tables must be the
+// model's and every platform handle the step took given back.
 //
 //   TMPDIR=/dev/shm korrin-soak --seed 7 --events 100000
 //
@@ -10,7 +10,6 @@
 // steps up to the first difference as a script, the log of that step and the
 // rows that differ, and exits 1. The engine commits every statement on its
 // own: a device root in memory (TMPDIR or --root) spares the disk's syncs.
-#include <package_manager.h>
 #include <sqlite3.h>
 #include <unistd.h>
 
@@ -52,7 +51,6 @@ std::string Flag(const char* name, bool was, bool now) {
 // The options of `package`, `app` and `update` that turn |was| into |now|.
 std::string Options(const sim::Package& was, const sim::Package& now) {
   return Flag("preload", was.preload, now.preload) + Flag("system", was.system, now.system) +
-         Flag("support-disable", was.supportDisable, now.supportDisable) +
          Flag("disabled", was.disabled, now.disabled);
 }
 std::string Options(const sim::App& was, const sim::App& now) {
@@ -87,43 +85,36 @@ class Generator {
     for (uint32_t weight : weights) total += weight;
     for (uint32_t draw = Below(total); draw >= weights[what]; ++what) draw -= weights[what];
     std::string pkgId = what == 2 ? Pick(model.packages).id : Pool();
-    for (int tries = 0; what == 0 && tries < 8 && model.packages.count(pkgId); ++tries) {
-      pkgId = Pool();  // mostly a package the device lacks
-    }
     sim::Package pkg;
     switch (what) {
       case 0:
-        if (model.packages.count(pkgId)) {
-          Update(model);
-          break;
-        }
+        if (model.packages.count(pkgId)) return Update(model.packages.at(pkgId), model);
         Describe(pkg = NewPackage(pkgId), true);
         Emit("install " + Arg(pkgId));
-        model.Install(pkg, PACKAGE_MANAGER_EVENT_TYPE_INSTALL);
+        model.Send(pkgId, PACKAGE_MANAGER_EVENT_TYPE_INSTALL, &pkg);
         break;
-      case 1: Update(model); break;
-      case 2: Emit("uninstall " + Arg(pkgId)); model.Uninstall(pkgId); break;
-      case 3: RawEvent(model); break;
-      case 4:  // a package added or taken away without an event
-        if (model.packages.erase(pkgId)) {
-          Emit("remove " + Arg(pkgId));
-        } else {
-          Describe(model.packages[pkgId] = NewPackage(pkgId), false);
-        }
+      case 1: return Update(Pick(model.packages), model);
+      case 2:
+        Emit("uninstall " + Arg(pkgId));
+        model.Send(pkgId, PACKAGE_MANAGER_EVENT_TYPE_UNINSTALL, NULL);
         break;
-      case 5: Emit("call PauseListenCb"); model.paused = true; break;
-      case 6: Emit("call StartListenCb"); model.Listen(); break;
-      case 7:  // the first time, now and then with a package installed once games are listed
-        if (!on && !model.packages.count(pkgId) && OneIn(2)) {
+      case 3: return RawEvent(model);
+      case 4:  // a package taken away or added quietly
+        if (model.packages.erase(pkgId)) return Emit("remove " + Arg(pkgId));
+        Describe(model.packages[pkgId] = NewPackage(pkgId), false);
+        break;
+      case 5: model.paused = true; return Emit("call PauseListenCb");
+      case 6: model.Listen(); return Emit("call StartListenCb");
+      case 7:  // the first time with a package installed once the games are listed
+        if (!on && !model.packages.count(pkgId)) {
           Describe(pkg = NewPackage(pkgId), true);
           Emit("before app_info_filter_destroy install " + Arg(pkgId));
         }
-        Emit("start");
         model.Start(pkg.id.empty() ? NULL : &pkg);
-        break;
-      case 8: BootDone(model); break;
-      case 9: Emit("call InsertPageData parentId=1 pageNo=" + std::to_string(++model.pages)); break;
-      default: Shortcut(model); break;
+        return Emit("start");
+      case 8: return BootDone(model);
+      case 9: return Emit("call InsertPageData parentId=1 pageNo=" + std::to_string(++model.pages));
+      default: return Shortcut(model);
     }
     return m_lines;
   }
@@ -140,7 +131,10 @@ class Generator {
   const typename Map::mapped_type& Pick(const Map& map) {
     return std::next(map.begin(), Below(map.size()))->second;
   }
-  void Emit(const std::string& line) { m_lines.push_back(line); }
+  std::vector<std::string> Emit(const std::string& line) {
+    m_lines.push_back(line);
+    return m_lines;
+  }
   std::string Pool() {
     uint32_t i = Below(kPool);
     return i == 0 ? "p'q" : i == 1 ? "p\xc3\xa9" : "p" + std::to_string(i);
@@ -167,8 +161,7 @@ class Generator {
     }
     pkg.preload = OneIn(8);
     pkg.system = OneIn(10);
-    pkg.supportDisable = OneIn(4);
-    pkg.disabled = pkg.supportDisable && OneIn(10);
+    pkg.disabled = OneIn(40);
     return pkg;
   }
 
@@ -182,33 +175,28 @@ class Generator {
     }
   }
 
-  // One change to an installed package or one of its applications; one
-  // named anew is added as a game, then changed.
-  void Update(Model& model) {
-    sim::Package pkg = Pick(model.packages);
-    const std::string added = pkg.id + "." + static_cast<char>('a' + pkg.apps.size());
-    const size_t i = Below(std::min<size_t>(pkg.apps.size() + 1, 4));
-    if (i == pkg.apps.size()) pkg.apps.push_back(sim::GameApp(added, added));
-    const sim::Package was = pkg;
-    sim::App& app = pkg.apps[i];
+  // One change to the installed package |was| or one of its applications.
+  std::vector<std::string> Update(const sim::Package& was, Model& model) {
+    sim::Package pkg = was;
+    sim::App& app = pkg.apps[Below(pkg.apps.size())];
+    const sim::App before = app;
     switch (Below(16)) {
       case 0: case 1: case 2: case 3: case 4: app.label = Label(); break;
       case 5: case 6: app.enabled = !app.enabled; break;
-      case 7: pkg.supportDisable = pkg.disabled = true; break;
-      case 8: pkg.disabled = false; break;
+      case 7: case 8: pkg.disabled = !pkg.disabled; break;
       case 9: case 10: app.noDisplay = !app.noDisplay; break;
       case 11: app.game = !app.game; break;
       case 12: app.component = PACKAGE_INFO_SERVICEAPP; break;
       case 13: pkg.preload = !pkg.preload; pkg.system = OneIn(3) != pkg.system; break;
     }
-    Emit("update " + Arg(pkg.id) + " --app " + Arg(app.id) + Options(was, pkg) +
-         Options(was.apps[i], app));
-    model.Install(pkg, PACKAGE_MANAGER_EVENT_TYPE_UPDATE);
+    Emit("update " + Arg(pkg.id) + " --app " + Arg(app.id) + Options(was, pkg) + Options(before, app));
+    model.Send(pkg.id, PACKAGE_MANAGER_EVENT_TYPE_UPDATE, &pkg);
+    return m_lines;
   }
 
   // Mostly for a package with a pending job or on the device, so that one
   // package sees whole sequences (STARTED, FAILED, a late COMPLETED).
-  void RawEvent(Model& model) {
+  std::vector<std::string> RawEvent(Model& model) {
     uint32_t whose = Below(10), type = Below(10), state = Below(50);
     std::string pkgId = whose < 4 && !model.jobs.empty()          ? Pick(model.jobs).pkgId
                         : whose < 7 && !model.packages.empty() ? Pick(model.packages).id
@@ -225,10 +213,11 @@ class Generator {
     Emit("event " + name(korrin_sim::kEventTypeNames, eventType) + " " +
          name(korrin_sim::kEventStateNames, eventState) + " " + Arg(pkgId));
     model.Event(pkgId, eventType, eventState);
+    return m_lines;
   }
 
   // The layout stays: games on the card are only read again.
-  void BootDone(const Model& model) {
+  std::vector<std::string> BootDone(const Model& model) {
     if (!OneIn(4)) Emit("call _RegisterEdbusSignalHandler");  // the signal ends it
     Emit(OneIn(2) ? "card in" : "card out");
     std::string onCard;
@@ -237,35 +226,29 @@ class Generator {
       onCard += " " + Arg(pkg.apps[Below(pkg.apps.size())].id);
     }
     if (!onCard.empty()) Emit("on-card" + onCard);
-    Emit("boot-done");
+    return Emit("boot-done");
   }
 
   // A shortcut of an application on the device or gone, on any page of menu
-  // 1, in a free cell up to a row below the last: the launcher may leave
-  // cells free, and new boxes must still follow the last one.
-  void Shortcut(Model& model) {
+  // 1, in any cell of the row below its last: the launcher may leave cells
+  // free, and new boxes must still follow the last one.
+  std::vector<std::string> Shortcut(Model& model) {
     const sim::Package* pkg = model.packages.empty() || OneIn(4) ? NULL : &Pick(model.packages);
-    soak::Box box{1 + static_cast<int>(Below(model.pages)), 0, 0,
+    soak::Box box{1 + static_cast<int>(Below(model.pages)), 1 + static_cast<int>(Below(4)), 1,
                   pkg ? pkg->apps[Below(pkg->apps.size())].id : Pool() + ".a", Label().value_or(""),
                   false, false, 3, static_cast<int>(Below(3)),
                   OneIn(4) ? "" : "/opt/usr/share/icons/shortcut-" + std::to_string(Below(9)) + ".png",
                   OneIn(3) ? "" : "launch?mode=" + std::to_string(Below(9))};
-    std::set<std::pair<int, int> > taken;
     for (const auto& b : model.boxes) {
-      if (b.second.pageId == box.pageId) taken.insert({b.second.row, b.second.col});
+      if (b.second.pageId == box.pageId) box.row = std::max(box.row, b.second.row + 1);
     }
-    do {
-      box.col = 1 + static_cast<int>(Below(4));
-      box.row = 1 + static_cast<int>(Below(taken.empty() ? 1 : taken.rbegin()->first + 1));
-    } while (taken.count({box.row, box.col}));
-    std::ostringstream line;
-    line << "call InsertBoxData boxType=3 pageId=" << box.pageId << " col=" << box.col
-         << " row=" << box.row << " launchType=" << box.launchType << " " << Arg("appId=" + box.appId);
-    if (!box.name.empty()) line << " " << Arg("name=" + box.name);
-    if (!box.iconPath.empty()) line << " " << Arg("iconPath=" + box.iconPath);
-    if (!box.content.empty()) line << " " << Arg("content=" + box.content);
-    Emit(line.str());
-    model.AddBox(box);
+    Emit("call InsertBoxData boxType=3 pageId=" + std::to_string(box.pageId) +
+         " col=" + std::to_string(box.col) + " row=" + std::to_string(box.row) +
+         " launchType=" + std::to_string(box.launchType) + " " + Arg("appId=" + box.appId) + " " +
+         Arg("name=" + box.name) + " " + Arg("iconPath=" + box.iconPath) + " " +
+         Arg("content=" + box.content));
+    model.boxes[++model.lastBoxId] = box;
+    return m_lines;
   }
 
   std::mt19937 m_rng;
@@ -297,20 +280,13 @@ int Soak(uint32_t seed, uint64_t events, uint64_t tamperAt, std::string root) {
   std::filesystem::remove(path + "-journal");
   const long rssAtStart = StatusKb("VmRSS");
   long rssWarm = -1;
-  // Only the listening client stays open, held since the library was loaded.
-  const int handles = device.OpenHandles();
+  const int handles = device.OpenHandles();  // the listening client's, held since the load
   Generator generator(seed);
   Model model;
   for (uint64_t k = 1; k <= events; ++k) {
     device.ClearLogs();  // the device keeps every line otherwise
-    for (const std::string& line : generator.Next(model)) {
-      try {
-        session.Execute(line);
-      } catch (const std::exception& e) {
-        std::cerr << "korrin-soak: step " << k << ": " << line << ": " << e.what() << "\n";
-        return 2;
-      }
-    }
+    // A line korrin-sim refuses is the generator's mistake, and ends the run.
+    for (const std::string& line : generator.Next(model)) session.Execute(line);
     if (k == tamperAt) {  // self-test: the newest box moves down a row
       sqlite3* db = NULL;
       sqlite3_open(path.c_str(), &db);
@@ -318,28 +294,27 @@ int Soak(uint32_t seed, uint64_t events, uint64_t tamperAt, std::string root) {
                    NULL, NULL, NULL);
       sqlite3_close(db);
     }
-    std::ostringstream diff;  // the rows that differ, or "no changes"
+    std::ostringstream diff, script;  // the rows that differ, or "no changes"
     korrin_sim::PrintChanges(model.Expected(), korrin_sim::TakeSnapshot(path), diff);
-    if (diff.str() != "no changes\n" || device.OpenHandles() != handles) {
-      // The generator and the model alone draw the same steps again.
-      std::ostringstream script;
-      Generator again(seed);
-      Model untouched;
-      for (uint64_t j = 1; j <= k; ++j) {
-        script << "# step " << j << "\n";
-        for (const std::string& line : again.Next(untouched)) script << line << "\n";
-      }
-      std::ofstream(root + "/steps.ksim") << script.str();
-      std::cout << "seed " << seed << ": after step " << k << " of " << events << ", "
-                << device.OpenHandles() << " platform handles open (" << handles << " before)\n"
-                << "steps 1.." << k << " (`korrin-sim run " << root << "/steps.ksim` plays them):\n"
-                << script.str() << "log of step " << k << ":\n";
-      session.Execute("log --all");
-      std::cout << "rows that differ (- the model's, + the database's, ~ changed there):\n"
-                << diff.str() << "the device is left in " << root << "\n";
-      return 1;
+    if (diff.str() == "no changes\n" && device.OpenHandles() == handles) {
+      if (k == events / 10) rssWarm = StatusKb("VmRSS");
+      continue;
     }
-    if (k == events / 10) rssWarm = StatusKb("VmRSS");
+    Generator again(seed);  // the generator and a model alone draw the same steps again
+    Model untouched;
+    for (uint64_t j = 1; j <= k; ++j) {
+      script << "# step " << j << "\n";
+      for (const std::string& line : again.Next(untouched)) script << line << "\n";
+    }
+    std::ofstream(root + "/steps.ksim") << script.str();
+    std::cout << "seed " << seed << ": after step " << k << " of " << events << ", "
+              << device.OpenHandles() << " platform handles open (" << handles << " before)\n"
+              << "steps 1.." << k << " (`korrin-sim run " << root << "/steps.ksim` plays them):\n"
+              << script.str() << "log of step " << k << ":\n";
+    session.Execute("log --all");
+    std::cout << "rows that differ (- the model's, + the database's, ~ changed there):\n"
+              << diff.str() << "the device is left in " << root << "\n";
+    return 1;
   }
   std::cout << "seed " << seed << ": " << events << " events, layout matched\nVmRSS "
             << rssAtStart << " kB at start, " << rssWarm << " kB after a tenth, "

@@ -29,16 +29,13 @@ struct Box {
 
 class Model {
  public:
-  // An install or update: the device's STARTED, the package, COMPLETED.
-  void Install(const sim::Package& pkg, int type) {
-    Event(pkg.id, type, PACKAGE_MANAGER_EVENT_STATE_STARTED);
-    packages[pkg.id] = pkg;
-    Event(pkg.id, type, PACKAGE_MANAGER_EVENT_STATE_COMPLETED);
-  }
-  void Uninstall(const std::string& pkgId) {
-    Event(pkgId, PACKAGE_MANAGER_EVENT_TYPE_UNINSTALL, PACKAGE_MANAGER_EVENT_STATE_STARTED);
-    packages.erase(pkgId);
-    Event(pkgId, PACKAGE_MANAGER_EVENT_TYPE_UNINSTALL, PACKAGE_MANAGER_EVENT_STATE_COMPLETED);
+  // An install or update (|pkg| the new contents) or an uninstall (none):
+  // the device's STARTED, the change, COMPLETED.
+  void Send(const std::string& pkgId, int type, const sim::Package* pkg) {
+    Event(pkgId, type, PACKAGE_MANAGER_EVENT_STATE_STARTED);
+    if (pkg) packages[pkgId] = *pkg;
+    if (!pkg) packages.erase(pkgId);
+    Event(pkgId, type, PACKAGE_MANAGER_EVENT_STATE_COMPLETED);
   }
   // A start replaces the package's pending job; an uninstall names its
   // applications there, while they can still be read. A completion without a
@@ -57,9 +54,9 @@ class Model {
     }
   }
   // Listening pauses while the store is filled. The first time, every
-  // displayable, enabled game (of any component) is laid out by id, byte
-  // order, four to a row on page 1, its box holding only the id; then
-  // |meanwhile| (unless null) is installed.
+  // displayable, enabled game (of any component) is laid out by id, in byte
+  // order, four to a row on page 1, its box holding only the id; |meanwhile|
+  // (unless null) is installed once they are listed.
   void Start(const sim::Package* meanwhile) {
     paused = true;
     std::set<std::string> games;
@@ -73,10 +70,10 @@ class Model {
     if (!games.empty()) pages = 1;
     for (const std::string& appId : games) {
       int i = static_cast<int>(boxes.size());
-      boxes[nextBoxId++] = Box{1, i % 4 + 1, i / 4 + 1, appId, "", 0, 0, 0, 0, "", ""};
+      boxes[++lastBoxId] = Box{1, i % 4 + 1, i / 4 + 1, appId, "", 0, 0, 0, 0, "", ""};
     }
     started = true;
-    if (meanwhile) Install(*meanwhile, PACKAGE_MANAGER_EVENT_TYPE_INSTALL);
+    if (meanwhile) Send(meanwhile->id, PACKAGE_MANAGER_EVENT_TYPE_INSTALL, meanwhile);
     Listen();
   }
   // Held jobs run in the order they completed.
@@ -86,7 +83,6 @@ class Model {
     run.swap(held);
     for (const Job& job : run) Run(job);
   }
-  void AddBox(const Box& box) { boxes[nextBoxId++] = box; }
 
   // The tables as the engine must have stored them; none before the start.
   korrin_sim::Snapshot Expected() const {
@@ -97,19 +93,21 @@ class Model {
     s.tables["Menus"] = {{"menuId", "name", "type"}, {{1, {"1", "\"Apps\"", "0"}}}};
     s.tables["Pages"].columns = {"pageId", "isFolder", "parentId", "pageNo"};
     for (int id = 1; id <= pages; ++id) s.tables["Pages"].rows[id] = {n(id), "0", "1", n(id)};
-    korrin_sim::Snapshot::Table& b = s.tables["Boxes"];
-    b.columns = {"boxId", "isFolder", "pageParentId", "pageId", "appId", "name", "col",
-                 "row", "isPreload", "isSystem", "boxType", "launchType", "iconPath", "content"};
+    s.tables["Boxes"].columns = {"boxId", "isFolder", "pageParentId", "pageId", "appId", "name",
+                                 "col", "row", "isPreload", "isSystem", "boxType", "launchType",
+                                 "iconPath", "content"};
     for (const auto& e : boxes) {
-      const Box& x = e.second;
-      b.rows[e.first] = {n(e.first), "0", "NULL", n(x.pageId), text(x.appId), text(x.name),
-                         n(x.col), n(x.row), n(x.preload), n(x.system), n(x.boxType),
-                         n(x.launchType), text(x.iconPath), text(x.content)};
+      const Box& b = e.second;
+      s.tables["Boxes"].rows[e.first] = {
+          n(e.first), "0", "NULL", n(b.pageId), text(b.appId), text(b.name), n(b.col), n(b.row),
+          n(b.preload), n(b.system), n(b.boxType), n(b.launchType), text(b.iconPath), text(b.content)};
     }
     return s;
   }
 
-  // ---- The state, which the generator reads.
+  // ---- The state, which the generator reads and the launcher's own steps
+  // change: the stream adds menu 1's pages in number order and none goes, so
+  // page k has pageId k and pageNo k.
   struct Job {
     std::string pkgId;
     int type;
@@ -118,9 +116,7 @@ class Model {
   std::map<std::string, sim::Package> packages;  // on the device
   bool started = false, paused = false;
   std::map<std::string, Job> jobs;  // started, by package
-  // Menu 1's pages: the stream adds them in number order and none goes, so
-  // page k has pageId k and pageNo k.
-  int pages = 0;
+  int pages = 0, lastBoxId = 0;
   std::map<int, Box> boxes;
 
  private:
@@ -147,28 +143,28 @@ class Model {
     bool update = job.type == PACKAGE_MANAGER_EVENT_TYPE_UPDATE;
     if (job.type == PACKAGE_MANAGER_EVENT_TYPE_UNINSTALL) {
       for (const sim::App& app : job.apps) Uninstalled(app.id);
-    } else if (update || job.type == PACKAGE_MANAGER_EVENT_TYPE_INSTALL) {
-      for (const sim::App& app : EventApps(job.pkgId)) {
-        const sim::Package& pkg = packages.at(job.pkgId);
-        bool enabled = app.enabled && !pkg.disabled;
-        if (!enabled && update) Uninstalled(app.id);
-        Box* box = NULL;
-        std::pair<int, int> last(1, 0);  // (row, col) on the last page: before its first cell
-        for (auto& b : boxes) {
-          if (b.second.appId == app.id && b.second.boxType != 3) box = &b.second;
-          if (b.second.pageId == pages) last = std::max(last, {b.second.row, b.second.col});
-        }
-        if (!enabled || (box && !update)) continue;
-        if (!box) {
-          if (++last.second > 4) last = {last.first + 1, 1};
-          pages = std::max(pages, 1);  // a first page when the menu has none
-          box = &(boxes[nextBoxId++] =
-                      Box{pages, last.second, last.first, app.id, "", 0, 0, 0, 0, "", ""});
-        }
-        if (app.label) box->name = *app.label;
-        box->preload = pkg.preload;
-        box->system = pkg.system;
+    }
+    if (!update && job.type != PACKAGE_MANAGER_EVENT_TYPE_INSTALL) return;
+    for (const sim::App& app : EventApps(job.pkgId)) {
+      const sim::Package& pkg = packages.at(job.pkgId);
+      bool enabled = app.enabled && !pkg.disabled;
+      if (!enabled && update) Uninstalled(app.id);
+      Box* box = NULL;
+      std::pair<int, int> last(1, 0);  // (row, col) on the last page: before its first cell
+      for (auto& b : boxes) {
+        if (b.second.appId == app.id && b.second.boxType != 3) box = &b.second;
+        if (b.second.pageId == pages) last = std::max(last, {b.second.row, b.second.col});
       }
+      if (!enabled || (box && !update)) continue;
+      if (!box) {
+        if (++last.second > 4) last = {last.first + 1, 1};
+        pages = std::max(pages, 1);  // a first page when the menu has none
+        box = &(boxes[++lastBoxId] =
+                    Box{pages, last.second, last.first, app.id, "", 0, 0, 0, 0, "", ""});
+      }
+      if (app.label) box->name = *app.label;
+      box->preload = pkg.preload;
+      box->system = pkg.system;
     }
   }
 
@@ -194,7 +190,6 @@ class Model {
   }
 
   std::vector<Job> held;  // completed while paused
-  int nextBoxId = 1;
 };
 
 }  // namespace soak
