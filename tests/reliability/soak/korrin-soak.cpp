@@ -1,35 +1,199 @@
-// korrin-soak: a seeded random stream of korrin-sim command lines (package
-// operations, raw events, quiet changes of the device, pause and replay,
-// boot-done, restarts, the launcher's own pages and shortcuts) played through
-// korrin-sim's session; after every step the stored tables must be the
-// model's and every platform handle the step took given back.
-//
-//   TMPDIR=/dev/shm korrin-soak --seed 7 --events 100000
-//
-// prints "seed 7: 100000 events, layout matched" and the resident set, or the
-// steps up to the first difference as a script, the log of that step and the
-// rows that differ, and exits 1. The engine commits every statement on its
-// own: a device root in memory (TMPDIR or --root) spares the disk's syncs.
+// korrin-soak: a seeded random stream of korrin-sim command lines played
+// through korrin-sim's session. After every step the stored tables must be
+// the model's and every platform handle the step took given back; else it
+// prints the steps so far as a script, the log of the last step and the rows
+// that differ, and exits 1. The engine commits every statement on its own: a
+// device root in memory (TMPDIR=/dev/shm, or --root) spares the disk's syncs.
+#include <package_manager.h>
 #include <sqlite3.h>
 #include <unistd.h>
 
+#include <algorithm>
 #include <filesystem>
 #include <fstream>
 #include <iostream>
+#include <map>
+#include <numeric>
+#include <optional>
 #include <random>
+#include <set>
 #include <sstream>
 
 #include <boost/program_options.hpp>
 
-#include "reliability/soak/model.h"
+#include "cli.h"
 #include "session.h"
+#include "sim/device.h"
 
 namespace {
 
-using soak::Model;
+// ---- The model: what the device holds, the package jobs the engine keeps
+// and the tables it must have stored, written from the engine's described
+// behaviour and sharing no code with it.
 
-// A small pool, so that packages come and go and the layout stays small
-// however long the run; two ids carry a quote and non-ASCII bytes.
+struct Box {  // as stored, "" as NULL; a shortcut (box type 3) carries the texts
+  int pageId, col, row;
+  std::string appId, name;
+  bool preload, system;
+  int boxType, launchType;
+  std::string iconPath, content;
+};
+
+class Model {
+ public:
+  // An install or update to |pkg|, or an uninstall: STARTED, the change, COMPLETED.
+  void Send(const std::string& pkgId, int type, const sim::Package* pkg) {
+    Event(pkgId, type, PACKAGE_MANAGER_EVENT_STATE_STARTED);
+    if (pkg) packages[pkgId] = *pkg;
+    if (!pkg) packages.erase(pkgId);
+    Event(pkgId, type, PACKAGE_MANAGER_EVENT_STATE_COMPLETED);
+  }
+  // A start replaces the package's pending job (an uninstall's names its
+  // applications while they can be read); other states change nothing.
+  void Event(const std::string& pkgId, int type, int state) {
+    if (!started) return;  // nobody listens yet
+    if (state == PACKAGE_MANAGER_EVENT_STATE_STARTED) {
+      jobs[pkgId] = Job{pkgId, type, {}};
+      if (type == PACKAGE_MANAGER_EVENT_TYPE_UNINSTALL) jobs[pkgId].apps = EventApps(pkgId);
+    } else if (state == PACKAGE_MANAGER_EVENT_STATE_COMPLETED && jobs.count(pkgId)) {
+      held.push_back(jobs[pkgId]);
+      jobs.erase(pkgId);
+      if (!paused) Listen();
+    } else if (state == PACKAGE_MANAGER_EVENT_STATE_FAILED) {
+      jobs.erase(pkgId);
+    }
+  }
+  // Listening pauses while the store is filled: the first time, with every
+  // displayable, enabled game (any component) in byte order of id, four to a
+  // row on page 1, holding only the id. |meanwhile| comes once they are listed.
+  void Start(const sim::Package* meanwhile) {
+    paused = true;
+    std::set<std::string> games;
+    for (const auto& pkg : packages) {
+      for (const sim::App& app : pkg.second.apps) {
+        if (!started && app.game && !app.noDisplay && app.enabled && !pkg.second.disabled) {
+          games.insert(app.id);
+        }
+      }
+    }
+    if (!games.empty()) pages = 1;
+    for (const std::string& appId : games) {
+      int i = static_cast<int>(boxes.size());
+      boxes[++lastBoxId] = Box{1, i % 4 + 1, i / 4 + 1, appId, "", 0, 0, 0, 0, "", ""};
+    }
+    started = true;
+    if (meanwhile) Send(meanwhile->id, PACKAGE_MANAGER_EVENT_TYPE_INSTALL, meanwhile);
+    Listen();
+  }
+  void Listen() {  // held jobs run in the order they completed
+    paused = false;
+    std::vector<Job> run;
+    run.swap(held);
+    for (const Job& job : run) Run(job);
+  }
+
+  // The tables as the engine must have stored them; none before the start.
+  korrin_sim::Snapshot Expected() const {
+    korrin_sim::Snapshot s;
+    if (!started) return s;
+    auto n = [](int value) { return std::to_string(value); };
+    auto text = [](const std::string& t) { return t.empty() ? "NULL" : korrin_sim::Quote(t); };
+    s.tables["Menus"].rows[1] = {"1", "\"Apps\"", "0"};  // the columns are the database's
+    for (int id = 1; id <= pages; ++id) s.tables["Pages"].rows[id] = {n(id), "0", "1", n(id)};
+    for (const auto& e : boxes) {
+      const Box& b = e.second;
+      s.tables["Boxes"].rows[e.first] = {n(e.first), "0", "NULL", n(b.pageId), text(b.appId),
+                                         text(b.name), n(b.col), n(b.row), n(b.preload),
+                                         n(b.system), n(b.boxType), n(b.launchType),
+                                         text(b.iconPath), text(b.content)};
+    }
+    return s;
+  }
+
+  // ---- The state. The stream adds menu 1's pages in number order and none
+  // goes: page k has pageId k and pageNo k.
+  struct Job {  // an uninstall names its applications
+    std::string pkgId;
+    int type;
+    std::vector<sim::App> apps;
+  };
+  std::map<std::string, sim::Package> packages;  // on the device
+  bool started = false, paused = false;
+  std::map<std::string, Job> jobs;  // started, by package
+  int pages = 0, lastBoxId = 0;
+  std::map<int, Box> boxes;
+
+ private:
+  // Its UI applications up to the first that is not a game, but the hidden.
+  std::vector<sim::App> EventApps(const std::string& pkgId) const {
+    std::vector<sim::App> apps;
+    auto pkg = packages.find(pkgId);
+    for (size_t i = 0; pkg != packages.end() && i < pkg->second.apps.size(); ++i) {
+      const sim::App& app = pkg->second.apps[i];
+      if (app.component != PACKAGE_INFO_UIAPP) continue;
+      if (!app.game) break;
+      if (!app.noDisplay) apps.push_back(app);
+    }
+    return apps;
+  }
+
+  // A job reads the device when it runs (a held one at the replay). A new game
+  // gets a box after the last box of the last page, with its label and flags;
+  // an update rewrites those of a placed one, or takes it away when it
+  // disables it. A missing label keeps the name.
+  void Run(const Job& job) {
+    bool update = job.type == PACKAGE_MANAGER_EVENT_TYPE_UPDATE;
+    for (const sim::App& app : job.apps) Uninstalled(app.id);  // an uninstall
+    if (!update && job.type != PACKAGE_MANAGER_EVENT_TYPE_INSTALL) return;
+    for (const sim::App& app : EventApps(job.pkgId)) {
+      const sim::Package& pkg = packages.at(job.pkgId);
+      bool enabled = app.enabled && !pkg.disabled;
+      if (!enabled && update) Uninstalled(app.id);
+      Box* box = NULL;
+      std::pair<int, int> last(1, 0);  // (row, col) on the last page: before its first cell
+      for (auto& b : boxes) {
+        if (b.second.appId == app.id && b.second.boxType != 3) box = &b.second;
+        if (b.second.pageId == pages) last = std::max(last, {b.second.row, b.second.col});
+      }
+      if (!enabled || (box && !update)) continue;
+      if (!box) {
+        if (++last.second > 4) last = {last.first + 1, 1};
+        pages = std::max(pages, 1);  // a first page when the menu has none
+        box = &(boxes[++lastBoxId] =
+                    Box{pages, last.second, last.first, app.id, "", 0, 0, 0, 0, "", ""});
+      }
+      if (app.label) box->name = *app.label;
+      box->preload = pkg.preload;
+      box->system = pkg.system;
+    }
+  }
+
+  // Its box and shortcuts go; each page that lost one is packed four wide.
+  void Uninstalled(const std::string& appId) {
+    std::set<int> affected;
+    for (auto b = boxes.begin(); b != boxes.end();) {
+      if (b->second.appId == appId) affected.insert(b->second.pageId);
+      b = b->second.appId == appId ? boxes.erase(b) : std::next(b);
+    }
+    for (int pageId : affected) {
+      std::map<std::pair<int, int>, Box*> left;  // by (row, col)
+      for (auto& b : boxes) {
+        if (b.second.pageId == pageId) left[{b.second.row, b.second.col}] = &b.second;
+      }
+      int i = 0;
+      for (auto& b : left) {
+        b.second->col = i % 4 + 1;
+        b.second->row = i++ / 4 + 1;
+      }
+    }
+  }
+
+  std::vector<Job> held;  // completed while paused
+};
+
+// ---- The stream.
+
+// A small pool keeps the layout small however long the run.
 const uint32_t kPool = 32;
 const char* const kLabels[] = {"Tide", "Ember", "Racer", "Chess", "Nova", "Orbit", "it's on",
                                "\"quoted\"", "x'); DROP TABLE Boxes; --", "\xc3\x89" "checs",
@@ -61,9 +225,8 @@ std::string Options(const sim::App& was, const sim::App& now) {
   return options + (now.component == PACKAGE_INFO_UIAPP ? " --component ui" : " --component service");
 }
 
-// The same seed gives the same lines on every platform: draws use
-// std::mt19937's raw output, which the standard fixes, and none of the
-// library's distributions, whose algorithms it leaves open.
+// The same seed gives the same lines everywhere: draws use std::mt19937's raw
+// output, which the standard fixes, not the library's distributions.
 class Generator {
  public:
   explicit Generator(uint32_t seed) : m_rng(seed) {}
@@ -81,28 +244,26 @@ class Generator {
         16, 5, paused ? 0u : 3u, paused ? 12u : 1u,   // raw event, quiet change, pause, replay
         on ? 1u : 6u, on ? 2u : 0u,                   // start, boot-done
         on && model.pages < 4 ? 1u : 0u, model.pages ? 3u : 0u};  // page, shortcut
-    uint32_t total = 0, what = 0;
-    for (uint32_t weight : weights) total += weight;
-    for (uint32_t draw = Below(total); draw >= weights[what]; ++what) draw -= weights[what];
+    uint32_t what = 0, draw = Below(std::accumulate(weights, weights + 11, 0u));
+    for (; draw >= weights[what]; ++what) draw -= weights[what];
     std::string pkgId = what == 2 ? Pick(model.packages).id : Pool();
     sim::Package pkg;
     switch (what) {
       case 0:
         if (model.packages.count(pkgId)) return Update(model.packages.at(pkgId), model);
         Describe(pkg = NewPackage(pkgId), true);
-        Emit("install " + Arg(pkgId));
         model.Send(pkgId, PACKAGE_MANAGER_EVENT_TYPE_INSTALL, &pkg);
-        break;
+        return Emit("install " + Arg(pkgId));
       case 1: return Update(Pick(model.packages), model);
       case 2:
-        Emit("uninstall " + Arg(pkgId));
         model.Send(pkgId, PACKAGE_MANAGER_EVENT_TYPE_UNINSTALL, NULL);
-        break;
+        return Emit("uninstall " + Arg(pkgId));
       case 3: return RawEvent(model);
       case 4:  // a package taken away or added quietly
+        Touch(pkgId);
         if (model.packages.erase(pkgId)) return Emit("remove " + Arg(pkgId));
         Describe(model.packages[pkgId] = NewPackage(pkgId), false);
-        break;
+        return m_lines;
       case 5: model.paused = true; return Emit("call PauseListenCb");
       case 6: model.Listen(); return Emit("call StartListenCb");
       case 7:  // the first time with a package installed once the games are listed
@@ -114,18 +275,12 @@ class Generator {
         return Emit("start");
       case 8: return BootDone(model);
       case 9: return Emit("call InsertPageData parentId=1 pageNo=" + std::to_string(++model.pages));
-      default: return Shortcut(model);
     }
-    return m_lines;
+    return Shortcut(model);
   }
 
  private:
-  uint32_t Below(size_t n) {  // uniform in [0, n): the short top range is rejected
-    const uint32_t bound = static_cast<uint32_t>(n), reject = -bound % bound;
-    uint32_t draw;
-    do draw = static_cast<uint32_t>(m_rng()); while (draw < reject);
-    return draw % bound;
-  }
+  uint32_t Below(size_t n) { return static_cast<uint32_t>(m_rng() % n); }
   bool OneIn(uint32_t n) { return Below(n) == 0; }
   template <typename Map>
   const typename Map::mapped_type& Pick(const Map& map) {
@@ -143,6 +298,13 @@ class Generator {
     if (OneIn(20)) return std::nullopt;
     std::string label = kLabels[Below(sizeof kLabels / sizeof kLabels[0])];
     return OneIn(2) ? label + " " + std::to_string(Below(10)) : label;
+  }
+  // Raw events favour packages touched lately, so that one sees sequences (a
+  // quiet add, STARTED, FAILED, a late COMPLETED) rather than lone events.
+  void Touch(const std::string& pkgId) {
+    if (std::find(m_recent.begin(), m_recent.end(), pkgId) != m_recent.end()) return;
+    if (m_recent.size() == 6) m_recent.erase(m_recent.begin());
+    m_recent.push_back(pkgId);
   }
 
   // Mostly one game; now and then another application alone, or several of
@@ -165,8 +327,7 @@ class Generator {
     return pkg;
   }
 
-  // The lines that describe a new package to korrin-sim, from its empty
-  // package and new application; |held|: for an install to send.
+  // A new package from korrin-sim's empty one and new applications.
   void Describe(const sim::Package& pkg, bool held) {
     std::string options = Options(sim::MakePackage(pkg.id, {}), pkg);
     if (held || !options.empty()) Emit("package " + Arg(pkg.id) + (held ? " --held" : "") + options);
@@ -190,17 +351,17 @@ class Generator {
       case 13: pkg.preload = !pkg.preload; pkg.system = OneIn(3) != pkg.system; break;
     }
     Emit("update " + Arg(pkg.id) + " --app " + Arg(app.id) + Options(was, pkg) + Options(before, app));
-    model.Send(pkg.id, PACKAGE_MANAGER_EVENT_TYPE_UPDATE, &pkg);
+    model.Send(pkg.id, PACKAGE_MANAGER_EVENT_TYPE_UPDATE, &pkg);  // |was| changes with it
     return m_lines;
   }
 
-  // Mostly for a package with a pending job or on the device, so that one
-  // package sees whole sequences (STARTED, FAILED, a late COMPLETED).
+  // Mostly for a package with a pending job or touched lately.
   std::vector<std::string> RawEvent(Model& model) {
     uint32_t whose = Below(10), type = Below(10), state = Below(50);
-    std::string pkgId = whose < 4 && !model.jobs.empty()          ? Pick(model.jobs).pkgId
-                        : whose < 7 && !model.packages.empty() ? Pick(model.packages).id
-                                                                  : Pool();
+    std::string pkgId = whose < 4 && !model.jobs.empty() ? Pick(model.jobs).pkgId
+                        : whose < 8 && !m_recent.empty() ? m_recent[Below(m_recent.size())]
+                                                         : Pool();
+    Touch(pkgId);
     int eventType = type < 7 ? static_cast<int>(type % 3) : std::vector<int>{3, -1, 1000}[type - 7];
     int eventState = state < 20   ? PACKAGE_MANAGER_EVENT_STATE_STARTED
                      : state < 35 ? PACKAGE_MANAGER_EVENT_STATE_COMPLETED
@@ -210,10 +371,9 @@ class Generator {
     auto name = [](const std::vector<std::string>& names, int value) {
       return value >= 0 && value < static_cast<int>(names.size()) ? names[value] : std::to_string(value);
     };
-    Emit("event " + name(korrin_sim::kEventTypeNames, eventType) + " " +
-         name(korrin_sim::kEventStateNames, eventState) + " " + Arg(pkgId));
     model.Event(pkgId, eventType, eventState);
-    return m_lines;
+    return Emit("event " + name(korrin_sim::kEventTypeNames, eventType) + " " +
+                name(korrin_sim::kEventStateNames, eventState) + " " + Arg(pkgId));
   }
 
   // The layout stays: games on the card are only read again.
@@ -229,40 +389,31 @@ class Generator {
     return Emit("boot-done");
   }
 
-  // A shortcut of an application on the device or gone, on any page of menu
-  // 1, in any cell of the row below its last: the launcher may leave cells
-  // free, and new boxes must still follow the last one.
+  // A shortcut below a page's last row leaves cells free: new boxes follow it.
   std::vector<std::string> Shortcut(Model& model) {
     const sim::Package* pkg = model.packages.empty() || OneIn(4) ? NULL : &Pick(model.packages);
-    soak::Box box{1 + static_cast<int>(Below(model.pages)), 1 + static_cast<int>(Below(4)), 1,
-                  pkg ? pkg->apps[Below(pkg->apps.size())].id : Pool() + ".a", Label().value_or(""),
-                  false, false, 3, static_cast<int>(Below(3)),
-                  OneIn(4) ? "" : "/opt/usr/share/icons/shortcut-" + std::to_string(Below(9)) + ".png",
-                  OneIn(3) ? "" : "launch?mode=" + std::to_string(Below(9))};
+    Box box{1 + static_cast<int>(Below(model.pages)), 1 + static_cast<int>(Below(4)), 1,
+            pkg ? pkg->apps[Below(pkg->apps.size())].id : Pool() + ".a", Label().value_or(""),
+            false, false, 3, static_cast<int>(Below(3)),
+            OneIn(4) ? "" : "/opt/usr/share/icons/shortcut-" + std::to_string(Below(9)) + ".png",
+            OneIn(3) ? "" : "launch?mode=" + std::to_string(Below(9))};
     for (const auto& b : model.boxes) {
       if (b.second.pageId == box.pageId) box.row = std::max(box.row, b.second.row + 1);
     }
-    Emit("call InsertBoxData boxType=3 pageId=" + std::to_string(box.pageId) +
-         " col=" + std::to_string(box.col) + " row=" + std::to_string(box.row) +
-         " launchType=" + std::to_string(box.launchType) + " " + Arg("appId=" + box.appId) + " " +
-         Arg("name=" + box.name) + " " + Arg("iconPath=" + box.iconPath) + " " +
-         Arg("content=" + box.content));
     model.boxes[++model.lastBoxId] = box;
-    return m_lines;
+    return Emit("call InsertBoxData boxType=3 pageId=" + std::to_string(box.pageId) +
+                " col=" + std::to_string(box.col) + " row=" + std::to_string(box.row) +
+                " launchType=" + std::to_string(box.launchType) + " " + Arg("appId=" + box.appId) +
+                " " + Arg("name=" + box.name) + " " + Arg("iconPath=" + box.iconPath) + " " +
+                Arg("content=" + box.content));
   }
 
   std::mt19937 m_rng;
+  std::vector<std::string> m_recent;
   std::vector<std::string> m_lines;  // of the step being drawn
 };
 
-// The value of |field| ("VmRSS", "VmHWM") in /proc/self/status, in kB.
-long StatusKb(const std::string& field) {
-  std::ifstream status("/proc/self/status");
-  for (std::string line; std::getline(status, line);) {
-    if (line.compare(0, field.size() + 1, field + ":") == 0) return atol(&line[field.size() + 1]);
-  }
-  return -1;
-}
+// ---- The run.
 
 int Soak(uint32_t seed, uint64_t events, uint64_t tamperAt, std::string root) {
   const bool temporary = root.empty();
@@ -278,8 +429,6 @@ int Soak(uint32_t seed, uint64_t events, uint64_t tamperAt, std::string root) {
   const std::string path = session.DatabasePath();
   std::filesystem::remove(path);  // the model starts from an empty store
   std::filesystem::remove(path + "-journal");
-  const long rssAtStart = StatusKb("VmRSS");
-  long rssWarm = -1;
   const int handles = device.OpenHandles();  // the listening client's, held since the load
   Generator generator(seed);
   Model model;
@@ -296,10 +445,7 @@ int Soak(uint32_t seed, uint64_t events, uint64_t tamperAt, std::string root) {
     }
     std::ostringstream diff, script;  // the rows that differ, or "no changes"
     korrin_sim::PrintChanges(model.Expected(), korrin_sim::TakeSnapshot(path), diff);
-    if (diff.str() == "no changes\n" && device.OpenHandles() == handles) {
-      if (k == events / 10) rssWarm = StatusKb("VmRSS");
-      continue;
-    }
+    if (diff.str() == "no changes\n" && device.OpenHandles() == handles) continue;
     Generator again(seed);  // the generator and a model alone draw the same steps again
     Model untouched;
     for (uint64_t j = 1; j <= k; ++j) {
@@ -316,9 +462,7 @@ int Soak(uint32_t seed, uint64_t events, uint64_t tamperAt, std::string root) {
               << diff.str() << "the device is left in " << root << "\n";
     return 1;
   }
-  std::cout << "seed " << seed << ": " << events << " events, layout matched\nVmRSS "
-            << rssAtStart << " kB at start, " << rssWarm << " kB after a tenth, "
-            << StatusKb("VmRSS") << " kB at end; VmHWM " << StatusKb("VmHWM") << " kB\n";
+  std::cout << "seed " << seed << ": " << events << " events, layout matched\n";
   if (temporary) std::filesystem::remove_all(root);
   return 0;
 }
@@ -336,7 +480,7 @@ int main(int argc, char** argv) {
       "root", po::value(&root)->value_name("DIR"),
       "the device's folder (default: a temporary one, kept if the run fails)")(
       "tamper-at", po::value(&tamperAt)->default_value(0)->value_name("K"),
-      "self-test: move a box behind the engine's back after step K")("help", "these options");
+      "self-test: move a box behind the engine's back after step K");
   po::variables_map values;
   try {
     po::store(po::parse_command_line(argc, argv, options), values);
@@ -345,6 +489,5 @@ int main(int argc, char** argv) {
     std::cerr << "korrin-soak: " << e.what() << "\n" << options;
     return 2;
   }
-  if (values.count("help")) std::cout << options;
-  return values.count("help") ? 0 : Soak(seed, events, tamperAt, root);
+  return Soak(seed, events, tamperAt, root);
 }
