@@ -258,9 +258,9 @@ class Generator {
       case 2:
         model.Send(pkgId, PACKAGE_MANAGER_EVENT_TYPE_UNINSTALL, NULL);
         return Emit("uninstall " + Arg(pkgId));
-      case 3: return RawEvent(model);
+      case 3: return RawEvents(model);
       case 4:  // a package taken away or added quietly
-        Touch(pkgId);
+        m_last = pkgId;
         if (model.packages.erase(pkgId)) return Emit("remove " + Arg(pkgId));
         Describe(model.packages[pkgId] = NewPackage(pkgId), false);
         return m_lines;
@@ -299,14 +299,6 @@ class Generator {
     std::string label = kLabels[Below(sizeof kLabels / sizeof kLabels[0])];
     return OneIn(2) ? label + " " + std::to_string(Below(10)) : label;
   }
-  // Raw events favour packages touched lately, so that one sees sequences (a
-  // quiet add, STARTED, FAILED, a late COMPLETED) rather than lone events.
-  void Touch(const std::string& pkgId) {
-    if (std::find(m_recent.begin(), m_recent.end(), pkgId) != m_recent.end()) return;
-    if (m_recent.size() == 6) m_recent.erase(m_recent.begin());
-    m_recent.push_back(pkgId);
-  }
-
   // Mostly one game; now and then another application alone, or several of
   // every kind together.
   sim::Package NewPackage(const std::string& pkgId) {
@@ -355,27 +347,31 @@ class Generator {
     return m_lines;
   }
 
-  // Mostly for a package with a pending job or touched lately.
-  std::vector<std::string> RawEvent(Model& model) {
-    uint32_t whose = Below(10), type = Below(10), state = Below(50);
-    std::string pkgId = whose < 4 && !model.jobs.empty() ? Pick(model.jobs).pkgId
-                        : whose < 8 && !m_recent.empty() ? m_recent[Below(m_recent.size())]
-                                                         : Pool();
-    Touch(pkgId);
-    int eventType = type < 7 ? static_cast<int>(type % 3) : std::vector<int>{3, -1, 1000}[type - 7];
-    int eventState = state < 20   ? PACKAGE_MANAGER_EVENT_STATE_STARTED
-                     : state < 35 ? PACKAGE_MANAGER_EVENT_STATE_COMPLETED
-                     : state < 40 ? PACKAGE_MANAGER_EVENT_STATE_FAILED
-                     : state < 44 ? PACKAGE_MANAGER_EVENT_STATE_PROCESSING
-                                  : std::vector<int>{4, 9, -1, -100}[state % 4];
+  // One to three raw events for one package, mostly one with a pending job or
+  // the one touched last, so that sequences such as a quiet add, STARTED,
+  // FAILED and a late COMPLETED come about.
+  std::vector<std::string> RawEvents(Model& model) {
+    uint32_t whose = Below(10);
+    m_last = whose < 4 && !model.jobs.empty() ? Pick(model.jobs).pkgId
+             : whose < 8 && !m_last.empty()   ? m_last
+                                              : Pool();
     auto name = [](const std::vector<std::string>& names, int value) {
       return value >= 0 && value < static_cast<int>(names.size()) ? names[value] : std::to_string(value);
     };
-    model.Event(pkgId, eventType, eventState);
-    return Emit("event " + name(korrin_sim::kEventTypeNames, eventType) + " " +
-                name(korrin_sim::kEventStateNames, eventState) + " " + Arg(pkgId));
+    for (uint32_t n = 1 + Below(3), type, state; n > 0; --n) {
+      type = Below(10), state = Below(50);
+      int eventType = type < 7 ? static_cast<int>(type % 3) : std::vector<int>{3, -1, 1000}[type - 7];
+      int eventState = state < 20   ? PACKAGE_MANAGER_EVENT_STATE_STARTED
+                       : state < 35 ? PACKAGE_MANAGER_EVENT_STATE_COMPLETED
+                       : state < 42 ? PACKAGE_MANAGER_EVENT_STATE_FAILED
+                       : state < 46 ? PACKAGE_MANAGER_EVENT_STATE_PROCESSING
+                                    : std::vector<int>{4, 9, -1, -100}[state % 4];
+      model.Event(m_last, eventType, eventState);
+      Emit("event " + name(korrin_sim::kEventTypeNames, eventType) + " " +
+           name(korrin_sim::kEventStateNames, eventState) + " " + Arg(m_last));
+    }
+    return m_lines;
   }
-
   // The layout stays: games on the card are only read again.
   std::vector<std::string> BootDone(const Model& model) {
     if (!OneIn(4)) Emit("call _RegisterEdbusSignalHandler");  // the signal ends it
@@ -409,7 +405,7 @@ class Generator {
   }
 
   std::mt19937 m_rng;
-  std::vector<std::string> m_recent;
+  std::string m_last;  // the package quiet changes and raw events touched last
   std::vector<std::string> m_lines;  // of the step being drawn
 };
 
