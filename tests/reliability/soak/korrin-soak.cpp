@@ -2,8 +2,8 @@
 // through korrin-sim's session. After every step the stored tables must be
 // the model's and every platform handle the step took given back; else it
 // prints the steps so far as a script, the log of the last step and the rows
-// that differ, and exits 1. The engine commits every statement on its own: a
-// device root in memory (TMPDIR=/dev/shm, or --root) spares the disk's syncs.
+// that differ, leaves the device in $TMPDIR and exits 1. The engine commits
+// every statement on its own: a device in memory (TMPDIR=/dev/shm) is faster.
 #include <package_manager.h>
 #include <sqlite3.h>
 #include <unistd.h>
@@ -27,9 +27,8 @@
 
 namespace {
 
-// ---- The model: what the device holds, the package jobs the engine keeps
-// and the tables it must have stored, written from the engine's described
-// behaviour and sharing no code with it.
+// ---- The model: the device, the engine's package jobs and the tables it must
+// have stored, from the engine's described behaviour, sharing no code with it.
 
 struct Box {  // as stored, "" as NULL; a shortcut (box type 3) carries the texts
   int pageId, col, row;
@@ -63,9 +62,8 @@ class Model {
       jobs.erase(pkgId);
     }
   }
-  // Listening pauses while the store is filled: the first time, with every
-  // displayable, enabled game (any component) in byte order of id, four to a
-  // row on page 1, holding only the id. |meanwhile| comes once they are listed.
+  // Listening pauses while the store is first filled with every displayable,
+  // enabled game by id, four to a row on page 1; |meanwhile| comes after.
   void Start(const sim::Package* meanwhile) {
     paused = true;
     std::set<std::string> games;
@@ -112,11 +110,7 @@ class Model {
 
   // ---- The state. The stream adds menu 1's pages in number order and none
   // goes: page k has pageId k and pageNo k.
-  struct Job {  // an uninstall names its applications
-    std::string pkgId;
-    int type;
-    std::vector<sim::App> apps;
-  };
+  struct Job { std::string pkgId; int type; std::vector<sim::App> apps; };
   std::map<std::string, sim::Package> packages;  // on the device
   bool started = false, paused = false;
   std::map<std::string, Job> jobs;  // started, by package
@@ -124,13 +118,11 @@ class Model {
   std::map<int, Box> boxes;
 
  private:
-  // Its UI applications up to the first that is not a game, but the hidden.
+  // Its applications up to the first that is not a game, but the hidden.
   std::vector<sim::App> EventApps(const std::string& pkgId) const {
     std::vector<sim::App> apps;
-    auto pkg = packages.find(pkgId);
-    for (size_t i = 0; pkg != packages.end() && i < pkg->second.apps.size(); ++i) {
-      const sim::App& app = pkg->second.apps[i];
-      if (app.component != PACKAGE_INFO_UIAPP) continue;
+    if (!packages.count(pkgId)) return apps;
+    for (const sim::App& app : packages.at(pkgId).apps) {
       if (!app.game) break;
       if (!app.noDisplay) apps.push_back(app);
     }
@@ -220,9 +212,8 @@ std::string Options(const sim::Package& was, const sim::Package& now) {
 std::string Options(const sim::App& was, const sim::App& now) {
   std::string options = Flag("game", was.game, now.game) + Flag("enabled", was.enabled, now.enabled) +
                         Flag("no-display", was.noDisplay, now.noDisplay);
-  if (now.label != was.label) options += now.label ? " --label " + Arg(*now.label) : " --no-label";
-  if (now.component == was.component) return options;
-  return options + (now.component == PACKAGE_INFO_UIAPP ? " --component ui" : " --component service");
+  if (now.label == was.label) return options;
+  return options + (now.label ? " --label " + Arg(*now.label) : " --no-label");
 }
 
 // The same seed gives the same lines everywhere: draws use std::mt19937's raw
@@ -294,13 +285,12 @@ class Generator {
     uint32_t i = Below(kPool);
     return i == 0 ? "p'q" : i == 1 ? "p\xc3\xa9" : "p" + std::to_string(i);
   }
-  std::optional<std::string> Label() {
-    if (OneIn(20)) return std::nullopt;
-    std::string label = kLabels[Below(sizeof kLabels / sizeof kLabels[0])];
-    return OneIn(2) ? label + " " + std::to_string(Below(10)) : label;
+  std::optional<std::string> Label() {  // now and then none
+    std::string label = kLabels[Below(std::size(kLabels))];
+    if (OneIn(2)) label += " " + std::to_string(Below(10));
+    return OneIn(20) ? std::nullopt : std::optional<std::string>(label);
   }
-  // Mostly one game; now and then another application alone, or several of
-  // every kind together.
+  // Mostly one game; now and then another application, or several.
   sim::Package NewPackage(const std::string& pkgId) {
     sim::Package pkg = sim::MakePackage(pkgId, {});
     for (uint32_t shape = Below(10), i = 0; i < (shape < 7 ? 1 : 2 + shape % 3); ++i) {
@@ -311,7 +301,6 @@ class Generator {
       app.game = shape < 7 ? shape < 6 : !OneIn(4);
       app.noDisplay = OneIn(10);
       app.enabled = !OneIn(12);
-      if (OneIn(12)) app.component = PACKAGE_INFO_SERVICEAPP;
     }
     pkg.preload = OneIn(8);
     pkg.system = OneIn(10);
@@ -339,7 +328,6 @@ class Generator {
       case 7: case 8: pkg.disabled = !pkg.disabled; break;
       case 9: case 10: app.noDisplay = !app.noDisplay; break;
       case 11: app.game = !app.game; break;
-      case 12: app.component = PACKAGE_INFO_SERVICEAPP; break;
       case 13: pkg.preload = !pkg.preload; pkg.system = OneIn(3) != pkg.system; break;
     }
     Emit("update " + Arg(pkg.id) + " --app " + Arg(app.id) + Options(was, pkg) + Options(before, app));
@@ -348,8 +336,7 @@ class Generator {
   }
 
   // One to three raw events for one package, mostly one with a pending job or
-  // the one touched last, so that sequences such as a quiet add, STARTED,
-  // FAILED and a late COMPLETED come about.
+  // the one touched last: a quiet add, STARTED, FAILED, a late COMPLETED.
   std::vector<std::string> RawEvents(Model& model) {
     uint32_t whose = Below(10);
     m_last = whose < 4 && !model.jobs.empty() ? Pick(model.jobs).pkgId
@@ -376,12 +363,10 @@ class Generator {
   std::vector<std::string> BootDone(const Model& model) {
     if (!OneIn(4)) Emit("call _RegisterEdbusSignalHandler");  // the signal ends it
     Emit(OneIn(2) ? "card in" : "card out");
-    std::string onCard;
-    for (uint32_t n = Below(4); n > 0 && !model.packages.empty(); --n) {
+    if (!model.packages.empty() && OneIn(2)) {
       const sim::Package& pkg = Pick(model.packages);
-      onCard += " " + Arg(pkg.apps[Below(pkg.apps.size())].id);
+      Emit("on-card " + Arg(pkg.apps[Below(pkg.apps.size())].id));
     }
-    if (!onCard.empty()) Emit("on-card" + onCard);
     return Emit("boot-done");
   }
 
@@ -411,11 +396,9 @@ class Generator {
 
 // ---- The run.
 
-int Soak(uint32_t seed, uint64_t events, uint64_t tamperAt, std::string root) {
-  const bool temporary = root.empty();
-  if (temporary) {
-    root = std::filesystem::temp_directory_path() / ("korrin-soak-" + std::to_string(getpid()));
-  }
+int Soak(uint32_t seed, uint64_t events, uint64_t tamperAt) {
+  const std::string root =
+      std::filesystem::temp_directory_path() / ("korrin-soak-" + std::to_string(getpid()));
   sim::Device& device = sim::Device::Get();
   if (!device.UseRoot(root)) {
     std::cerr << "korrin-soak: cannot lay out a device under " << root << "\n";
@@ -423,8 +406,6 @@ int Soak(uint32_t seed, uint64_t events, uint64_t tamperAt, std::string root) {
   }
   korrin_sim::Session session(/*printActions=*/false);
   const std::string path = session.DatabasePath();
-  std::filesystem::remove(path);  // the model starts from an empty store
-  std::filesystem::remove(path + "-journal");
   const int handles = device.OpenHandles();  // the listening client's, held since the load
   Generator generator(seed);
   Model model;
@@ -455,11 +436,12 @@ int Soak(uint32_t seed, uint64_t events, uint64_t tamperAt, std::string root) {
               << script.str() << "log of step " << k << ":\n";
     session.Execute("log --all");
     std::cout << "rows that differ (- the model's, + the database's, ~ changed there):\n"
-              << diff.str() << "the device is left in " << root << "\n";
+              << diff.str();
+    if (tamperAt) std::filesystem::remove_all(root);  // a self-test keeps nothing
     return 1;
   }
   std::cout << "seed " << seed << ": " << events << " events, layout matched\n";
-  if (temporary) std::filesystem::remove_all(root);
+  std::filesystem::remove_all(root);
   return 0;
 }
 
@@ -469,12 +451,9 @@ int main(int argc, char** argv) {
   namespace po = boost::program_options;
   uint32_t seed;
   uint64_t events, tamperAt;
-  std::string root;
-  po::options_description options("usage: korrin-soak [--seed N] [--events N] [--root DIR]");
+  po::options_description options("usage: korrin-soak [--seed N] [--events N]");
   options.add_options()("seed", po::value(&seed)->default_value(1), "the stream's seed")(
       "events", po::value(&events)->default_value(1000), "steps to play and check")(
-      "root", po::value(&root)->value_name("DIR"),
-      "the device's folder (default: a temporary one, kept if the run fails)")(
       "tamper-at", po::value(&tamperAt)->default_value(0)->value_name("K"),
       "self-test: move a box behind the engine's back after step K");
   po::variables_map values;
@@ -485,5 +464,5 @@ int main(int argc, char** argv) {
     std::cerr << "korrin-soak: " << e.what() << "\n" << options;
     return 2;
   }
-  return Soak(seed, events, tamperAt, root);
+  return Soak(seed, events, tamperAt);
 }
