@@ -210,7 +210,8 @@ std::string Options(const sim::Package& was, const sim::Package& now) {
          Flag("disabled", was.disabled, now.disabled);
 }
 std::string Options(const sim::App& was, const sim::App& now) {
-  std::string options = Flag("game", was.game, now.game) + Flag("enabled", was.enabled, now.enabled) +
+  std::string options = Flag("game", was.game, now.game) +
+                        Flag("enabled", was.enabled, now.enabled) +
                         Flag("no-display", was.noDisplay, now.noDisplay);
   if (now.label == was.label) return options;
   return options + (now.label ? " --label " + Arg(*now.label) : " --no-label");
@@ -310,8 +311,8 @@ class Generator {
 
   // A new package from korrin-sim's empty one and new applications.
   void Describe(const sim::Package& pkg, bool held) {
-    std::string options = Options(sim::MakePackage(pkg.id, {}), pkg);
-    if (held || !options.empty()) Emit("package " + Arg(pkg.id) + (held ? " --held" : "") + options);
+    Emit("package " + Arg(pkg.id) + (held ? " --held" : "") +
+         Options(sim::MakePackage(pkg.id, {}), pkg));
     for (const sim::App& app : pkg.apps) {
       Emit("app " + Arg(pkg.id) + " " + Arg(app.id) + Options(sim::PlainApp(app.id, app.id), app));
     }
@@ -330,7 +331,8 @@ class Generator {
       case 11: app.game = !app.game; break;
       case 13: pkg.preload = !pkg.preload; pkg.system = OneIn(3) != pkg.system; break;
     }
-    Emit("update " + Arg(pkg.id) + " --app " + Arg(app.id) + Options(was, pkg) + Options(before, app));
+    Emit("update " + Arg(pkg.id) + " --app " + Arg(app.id) + Options(was, pkg) +
+         Options(before, app));
     model.Send(pkg.id, PACKAGE_MANAGER_EVENT_TYPE_UPDATE, &pkg);  // |was| changes with it
     return m_lines;
   }
@@ -342,20 +344,16 @@ class Generator {
     m_last = whose < 4 && !model.jobs.empty() ? Pick(model.jobs).pkgId
              : whose < 8 && !m_last.empty()   ? m_last
                                               : Pool();
-    auto name = [](const std::vector<std::string>& names, int value) {
-      return value >= 0 && value < static_cast<int>(names.size()) ? names[value] : std::to_string(value);
-    };
     for (uint32_t n = 1 + Below(3), type, state; n > 0; --n) {
       type = Below(10), state = Below(50);
-      int eventType = type < 7 ? static_cast<int>(type % 3) : std::vector<int>{3, -1, 1000}[type - 7];
-      int eventState = state < 20   ? PACKAGE_MANAGER_EVENT_STATE_STARTED
-                       : state < 35 ? PACKAGE_MANAGER_EVENT_STATE_COMPLETED
-                       : state < 42 ? PACKAGE_MANAGER_EVENT_STATE_FAILED
-                       : state < 46 ? PACKAGE_MANAGER_EVENT_STATE_PROCESSING
-                                    : std::vector<int>{4, 9, -1, -100}[state % 4];
+      const int eventType = type < 9 ? static_cast<int>(type % 3) : 7;  // 7: nobody knows it
+      const int eventState = state < 20   ? PACKAGE_MANAGER_EVENT_STATE_STARTED
+                             : state < 35 ? PACKAGE_MANAGER_EVENT_STATE_COMPLETED
+                             : state < 45 ? PACKAGE_MANAGER_EVENT_STATE_FAILED
+                                          : PACKAGE_MANAGER_EVENT_STATE_PROCESSING;
       model.Event(m_last, eventType, eventState);
-      Emit("event " + name(korrin_sim::kEventTypeNames, eventType) + " " +
-           name(korrin_sim::kEventStateNames, eventState) + " " + Arg(m_last));
+      Emit("event " + (type < 9 ? korrin_sim::kEventTypeNames[eventType] : "7") + " " +
+           korrin_sim::kEventStateNames[eventState] + " " + Arg(m_last));
     }
     return m_lines;
   }
@@ -404,7 +402,7 @@ int Soak(uint32_t seed, uint64_t events, uint64_t tamperAt) {
     std::cerr << "korrin-soak: cannot lay out a device under " << root << "\n";
     return 2;
   }
-  korrin_sim::Session session(/*printActions=*/false);
+  korrin_sim::Session session(/*printActions=*/false, /*recordChanges=*/false);
   const std::string path = session.DatabasePath();
   const int handles = device.OpenHandles();  // the listening client's, held since the load
   Generator generator(seed);
@@ -416,8 +414,8 @@ int Soak(uint32_t seed, uint64_t events, uint64_t tamperAt) {
     if (k == tamperAt) {  // self-test: the newest box moves down a row
       sqlite3* db = NULL;
       sqlite3_open(path.c_str(), &db);
-      sqlite3_exec(db, "UPDATE Boxes SET row = row + 1 WHERE boxId = (SELECT MAX(boxId) FROM Boxes)",
-                   NULL, NULL, NULL);
+      sqlite3_exec(db, "UPDATE Boxes SET row = row + 1 WHERE boxId = "
+                       "(SELECT MAX(boxId) FROM Boxes)", NULL, NULL, NULL);
       sqlite3_close(db);
     }
     std::ostringstream diff, script;  // the rows that differ, or "no changes"
