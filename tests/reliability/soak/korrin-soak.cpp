@@ -333,7 +333,7 @@ class Generator {
     }
     Emit("update " + Arg(pkg.id) + " --app " + Arg(app.id) + Options(was, pkg) +
          Options(before, app));
-    model.Send(pkg.id, PACKAGE_MANAGER_EVENT_TYPE_UPDATE, &pkg);  // |was| changes with it
+    model.Send(pkg.id, PACKAGE_MANAGER_EVENT_TYPE_UPDATE, &pkg);  // |was| is the model's
     return m_lines;
   }
 
