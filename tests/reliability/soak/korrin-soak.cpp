@@ -397,6 +397,7 @@ class Generator {
 int Soak(uint32_t seed, uint64_t events, uint64_t tamperAt) {
   const std::string root =
       std::filesystem::temp_directory_path() / ("korrin-soak-" + std::to_string(getpid()));
+  std::filesystem::remove_all(root);  // left by an earlier process of this id
   sim::Device& device = sim::Device::Get();
   if (!device.UseRoot(root)) {
     std::cerr << "korrin-soak: cannot lay out a device under " << root << "\n";
