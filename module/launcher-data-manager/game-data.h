@@ -11,6 +11,10 @@
 
 #include <string>
 
+// A box of this type is a shortcut: it carries its own name, icon path and
+// content, and is never found by application id.
+const int kShortcutBoxType = 3;
+
 // One menu; a row of table Menus.
 class GameViewData {
  public:
@@ -75,7 +79,7 @@ class GameBoxData {
   int badgeCount;
   bool isLocked;
   bool isOnStorageCard;  // set by the launcher application; the engine only clears it
-  int boxType;           // 3: a shortcut that carries its own name, icon and content
+  int boxType;           // kShortcutBoxType for a shortcut
   int launchType;
   std::string content;   // kept with a box of type 3
   bool isMenuLaunch;

@@ -26,10 +26,6 @@ typedef boost::shared_ptr<GameBoxData> BoxPtr;
 
 namespace {
 
-// A box of this type carries its own name, icon path and content, and is never
-// found by application id.
-const int kShortcutBoxType = 3;
-
 // The computed views number their pages from here; stored pages never get near.
 const int kVirtualPageBase = 100000;
 

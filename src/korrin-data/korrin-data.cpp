@@ -3,14 +3,12 @@
 // into the layout store. It holds no data of its own.
 //
 // The managers are ordinary static objects of this one file, so their order
-// is fixed: the stream initialiser, the store and the package tracker are
-// built at load in that order, and at unload the tracker goes first (its
-// destructor stops listening) and the store second (its destructor closes
-// the database).
+// is fixed: the store and the package tracker are built at load in that
+// order, and at unload the tracker goes first (its destructor stops
+// listening) and the store second (its destructor closes the database).
 #include "korrin-data/korrin-data.h"
 
 #include <algorithm>
-#include <ios>
 
 #include "common/log.h"
 
@@ -18,12 +16,8 @@ typedef boost::shared_ptr<GameBoxData> BoxPtr;
 
 namespace {
 
-std::ios_base::Init g_streamInitialiser;  // the library composes its SQL in string streams
 LauncherDataManager g_dataManager;
 LauncherPackageManager g_packageManager;
-
-// The launcher's shortcut boxes, which go with their application.
-const int kShortcutBoxType = 3;
 
 // The uninstall compaction lays every page out four wide, folder pages too,
 // with no row limit; kept as the launcher expects it.

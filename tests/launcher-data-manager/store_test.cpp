@@ -30,12 +30,12 @@ TEST_F(StoreTest, AVeryLongIdRoundTripsThroughEveryTextParameter) {
   int app = store.InsertBoxData(text, pageAdded);
   GameBoxData shortcut;
   shortcut.pageId = 1;
-  shortcut.boxType = 3;
+  shortcut.boxType = kShortcutBoxType;
   shortcut.appId = shortcut.name = shortcut.iconPath = shortcut.content = text;
   store.InsertBoxData(shortcut);
 
   EXPECT_EQ(app, store.GetBoxDataByAppId(text)->boxId);
-  std::vector<boost::shared_ptr<GameBoxData>> listed = store.GetBoxDataListByAppId(text, 3);
+  std::vector<boost::shared_ptr<GameBoxData>> listed = store.GetBoxDataListByAppId(text, kShortcutBoxType);
   ASSERT_EQ(1u, listed.size());
   EXPECT_EQ((Row{text, text, text}),
             (Row{listed[0]->name, listed[0]->iconPath, listed[0]->content}));

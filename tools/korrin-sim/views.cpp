@@ -7,6 +7,7 @@
 #include <set>
 
 #include "cli.h"
+#include "launcher-data-manager/game-data.h"
 #include "sim/device.h"
 
 namespace korrin_sim {
@@ -154,7 +155,7 @@ const char kNoDatabase[] = "no layout database yet: `start` makes it\n";
 std::string BoxLabel(bool isFolder, int boxType, const std::string& appId,
                      const std::string& name) {
   if (isFolder) return "[" + name + "]";
-  if (boxType == 3) return "<" + name + ">";
+  if (boxType == kShortcutBoxType) return "<" + name + ">";
   if (!name.empty()) return name;
   const sim::App* app = sim::Device::Get().FindApp(appId);
   return app != NULL && app->label && !app->label->empty() ? *app->label : appId;
