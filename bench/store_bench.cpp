@@ -159,7 +159,7 @@ std::vector<Operation> Operations() {
                                    l.store.InsertBoxData(b); }, DropLastBox, {kAll[0], kAll[1]}},
       {"InsertBoxData(shortcut)",
        [](L& l) { GameBoxData b; b.pageId = 1; b.col = 1; b.row = l.boxes / 4 + 2;
-                  b.appId = "com.ex.new"; b.name = "New"; b.boxType = 3;
+                  b.appId = "com.ex.new"; b.name = "New"; b.boxType = kShortcutBoxType;
                   b.iconPath = "/opt/icons/new.png"; b.content = "page=1";
                   l.store.InsertBoxData(b); }, DropLastBox, {kAll[0], kAll[1]}},
       {"UpdateBoxData", [](L& l) { GameBoxData b = l.MiddleRecord(); l.store.UpdateBoxData(b); },
