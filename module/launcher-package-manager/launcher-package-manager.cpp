@@ -50,6 +50,32 @@ class PlatformText {
   char* m_text;
 };
 
+// A platform handle, released by |Destroy| when it goes if it was ever made.
+template <typename Handle, int (*Destroy)(Handle)>
+class ScopedHandle {
+ public:
+  ScopedHandle() : m_handle(NULL) {}
+  ~ScopedHandle() {
+    if (m_handle != NULL) Destroy(m_handle);
+  }
+
+  Handle* Out() { return &m_handle; }
+  Handle& Get() { return m_handle; }
+  // Drops, unreleased, what a refused create may have left in the handle.
+  void Forget() { m_handle = NULL; }
+
+ private:
+  ScopedHandle(const ScopedHandle&) = delete;
+  ScopedHandle& operator=(const ScopedHandle&) = delete;
+
+  Handle m_handle;
+};
+
+typedef ScopedHandle<app_info_h, app_info_destroy> AppInfo;
+typedef ScopedHandle<app_info_filter_h, app_info_filter_destroy> AppInfoFilter;
+typedef ScopedHandle<package_info_h, package_info_destroy> PackageInfo;
+typedef ScopedHandle<package_manager_filter_h, package_manager_filter_destroy> PackageFilter;
+
 std::vector<std::string>* StringList(void* user_data) {
   return static_cast<std::vector<std::string>*>(user_data);
 }
@@ -132,15 +158,13 @@ bool LauncherPackageManager::GetAppName(std::string appId, boost::shared_ptr<Gam
 }
 
 bool LauncherPackageManager::_GetAppInfo(std::string appId, boost::shared_ptr<GameBoxData> box) {
-  app_info_h info = NULL;
-  int rc = app_info_create(appId.c_str(), &info);
+  AppInfo info;
+  int rc = app_info_create(appId.c_str(), info.Out());
   if (rc != APP_MANAGER_ERROR_NONE) {
     KLOG(DLOG_ERROR, "app_info_create return [%d]", rc);
     return false;
   }
-  bool read = _GetAppInfo(info, box);
-  app_info_destroy(info);
-  return read;
+  return _GetAppInfo(info.Get(), box);
 }
 
 bool LauncherPackageManager::_GetAppInfo(app_info_h& info, boost::shared_ptr<GameBoxData> box) {
@@ -150,7 +174,6 @@ bool LauncherPackageManager::_GetAppInfo(app_info_h& info, boost::shared_ptr<Gam
   bool isRemovable = true;
   bool isPreload = false;
   bool isSystem = false;
-  package_info_h pkgInfo = NULL;
   bool read = false;
 
   // Each read runs only when the ones before it succeeded.
@@ -176,23 +199,24 @@ bool LauncherPackageManager::_GetAppInfo(app_info_h& info, boost::shared_ptr<Gam
     KLOG(DLOG_ERROR, " app_info_get_type appid[%s] pkg_id[%s] pkg_type[%s]", appId.ForLog(),
          pkgId.ForLog(), type.ForLog());
     // The first text names the package manager's call, not the one made; kept.
-    if ((rc = package_info_create(pkgId.Get(), &pkgInfo)) != PACKAGE_MANAGER_ERROR_NONE) {
+    // The package's handle goes at the end of this branch, before the verdict.
+    PackageInfo pkgInfo;
+    if ((rc = package_info_create(pkgId.Get(), pkgInfo.Out())) != PACKAGE_MANAGER_ERROR_NONE) {
       KLOG(DLOG_ERROR, "package_manager_get_package_info return [%d]", rc);
-      pkgInfo = NULL;
-    } else if ((rc = package_info_is_system_package(pkgInfo, &isSystem)) !=
+      pkgInfo.Forget();
+    } else if ((rc = package_info_is_system_package(pkgInfo.Get(), &isSystem)) !=
                PACKAGE_MANAGER_ERROR_NONE) {
       KLOG(DLOG_ERROR, "package_info_is_system_package return [%d]", rc);
-    } else if ((rc = package_info_is_removable_package(pkgInfo, &isRemovable)) !=
+    } else if ((rc = package_info_is_removable_package(pkgInfo.Get(), &isRemovable)) !=
                PACKAGE_MANAGER_ERROR_NONE) {
       KLOG(DLOG_ERROR, "package_info_is_removable_package return [%d]", rc);
-    } else if ((rc = package_info_is_preload_package(pkgInfo, &isPreload)) !=
+    } else if ((rc = package_info_is_preload_package(pkgInfo.Get(), &isPreload)) !=
                PACKAGE_MANAGER_ERROR_NONE) {
       KLOG(DLOG_ERROR, "package_info_is_preload_package return [%d]", rc);
     } else {
       read = true;
     }
   }
-  if (pkgInfo != NULL) package_info_destroy(pkgInfo);
   if (!read) {
     KLOG(DLOG_ERROR, "AppId[%s] failed to get pkginfo", appId.ForLog());
     return false;
@@ -266,23 +290,23 @@ bool LauncherPackageManager::_GetAllAppsInfoCb(app_info_h info, void* user_data)
 std::vector<std::string> LauncherPackageManager::_GetAppIds(const char* pkgId) {
   KLOG(DLOG_ERROR, "BEGIN");
   std::vector<std::string> appIds;
-  package_info_h pkgInfo = NULL;
-  if (package_manager_get_package_info(pkgId, &pkgInfo) != PACKAGE_MANAGER_ERROR_NONE) {
-    KLOG(DLOG_ERROR, "package_manager_get_package_info[%s] != PACKAGE_MANAGER_ERROR_NONE",
-         pkgId != NULL ? pkgId : "(null)");
-  } else {
-    if (package_info_foreach_app_from_package(pkgInfo, PACKAGE_INFO_UIAPP,
-                                              _PkgMgrAppInfoGetListCb, &appIds) !=
-        PACKAGE_MANAGER_ERROR_NONE) {
+  {
+    PackageInfo pkgInfo;  // released before the ids are logged
+    if (package_manager_get_package_info(pkgId, pkgInfo.Out()) != PACKAGE_MANAGER_ERROR_NONE) {
+      KLOG(DLOG_ERROR, "package_manager_get_package_info[%s] != PACKAGE_MANAGER_ERROR_NONE",
+           pkgId != NULL ? pkgId : "(null)");
+      pkgInfo.Forget();
+    } else if (package_info_foreach_app_from_package(pkgInfo.Get(), PACKAGE_INFO_UIAPP,
+                                                     _PkgMgrAppInfoGetListCb, &appIds) !=
+               PACKAGE_MANAGER_ERROR_NONE) {
       KLOG(DLOG_ERROR, "package_info_foreach_app_from_package != PACKAGE_MANAGER_ERROR_NONE");
-      if (package_info_foreach_app_from_package(pkgInfo, PACKAGE_INFO_ALLAPP,
+      if (package_info_foreach_app_from_package(pkgInfo.Get(), PACKAGE_INFO_ALLAPP,
                                                 _PkgMgrAppInfoGetListCb, &appIds) !=
           PACKAGE_MANAGER_ERROR_NONE) {
         KLOG(DLOG_ERROR,
              "try again package_info_foreach_app_from_package != PACKAGE_MANAGER_ERROR_NONE");
       }
     }
-    package_info_destroy(pkgInfo);
   }
   for (size_t i = 0; i < appIds.size(); ++i) KLOG(DLOG_ERROR, "##### [%s]", appIds[i].c_str());
   KLOG(DLOG_ERROR, "END");
@@ -292,23 +316,24 @@ std::vector<std::string> LauncherPackageManager::_GetAppIds(const char* pkgId) {
 bool LauncherPackageManager::_PkgMgrAppInfoGetListCb(package_info_app_component_type_e,
                                                      const char* appId, void* user_data) {
   std::vector<std::string>* appIds = StringList(user_data);
-  app_info_h info = NULL;
-  if (app_info_create(appId, &info) != APP_MANAGER_ERROR_NONE) return false;
+  AppInfo info;
+  if (app_info_create(appId, info.Out()) != APP_MANAGER_ERROR_NONE) return false;
 
   // Stopping at the first non-game ends the whole package's listing; kept.
   bool goOn = false;
   bool isGame = true;
-  int rc = app_info_is_game(info, &isGame);
+  int rc = app_info_is_game(info.Get(), &isGame);
   KLOG(DLOG_ERROR, "App [%s], [%d] [%d]", appId, rc, isGame);
   bool isNoDisplay = false;
   if (rc == APP_MANAGER_ERROR_NONE && isGame &&
-      app_info_is_nodisplay(info, &isNoDisplay) == APP_MANAGER_ERROR_NONE) {
+      app_info_is_nodisplay(info.Get(), &isNoDisplay) == APP_MANAGER_ERROR_NONE) {
     if (isNoDisplay) {
       KLOG(DLOG_ERROR, "this package is no display");
       goOn = true;
     } else {
       PlatformText id;
-      if (app_info_get_app_id(info, id.Out()) == APP_MANAGER_ERROR_NONE && id.Get() != NULL) {
+      if (app_info_get_app_id(info.Get(), id.Out()) == APP_MANAGER_ERROR_NONE &&
+          id.Get() != NULL) {
         appIds->push_back(id.Get());
         goOn = true;
       }
@@ -319,39 +344,32 @@ bool LauncherPackageManager::_PkgMgrAppInfoGetListCb(package_info_app_component_
       KLOG(DLOG_ERROR, "##### [%s]", (*appIds)[i].c_str());
     }
   }
-  app_info_destroy(info);
   return goOn;
 }
 
 bool LauncherPackageManager::_IsMenuLaunch(std::string appId) {
-  app_info_filter_h handle = NULL;
-  if (app_info_filter_create(&handle) != APP_MANAGER_ERROR_NONE) {
+  AppInfoFilter handle;
+  if (app_info_filter_create(handle.Out()) != APP_MANAGER_ERROR_NONE) {
     KLOG(DLOG_ERROR, "(%s)", "APP_MANAGER_ERROR_NONE != app_info_filter_create(&handle)");
     return false;
   }
   bool found = false;
-  if (app_info_filter_add_string(handle, PACKAGE_INFO_PROP_APP_CATEGORY, kFloatingAppCategory) !=
+  if (app_info_filter_add_string(handle.Get(), PACKAGE_INFO_PROP_APP_CATEGORY,
+                                 kFloatingAppCategory) != APP_MANAGER_ERROR_NONE ||
+      app_info_filter_add_string(handle.Get(), PACKAGE_INFO_PROP_APP_ID, appId.c_str()) !=
           APP_MANAGER_ERROR_NONE ||
-      app_info_filter_add_string(handle, PACKAGE_INFO_PROP_APP_ID, appId.c_str()) !=
-          APP_MANAGER_ERROR_NONE ||
-      app_info_filter_foreach_appinfo(handle, _has_mini_app_cb, &found) !=
+      app_info_filter_foreach_appinfo(handle.Get(), _has_mini_app_cb, &found) !=
           APP_MANAGER_ERROR_NONE) {
-    app_info_filter_destroy(handle);
     return false;
   }
   if (!found) {
-    app_info_h info = NULL;
-    if (app_info_create(appId.c_str(), &info) != APP_MANAGER_ERROR_NONE) {
-      app_info_filter_destroy(handle);
-      return false;
-    }
-    if (app_info_foreach_metadata(info, _app_metadata_list_cb, &found) !=
+    AppInfo info;
+    if (app_info_create(appId.c_str(), info.Out()) != APP_MANAGER_ERROR_NONE) return false;
+    if (app_info_foreach_metadata(info.Get(), _app_metadata_list_cb, &found) !=
         APP_MANAGER_ERROR_NONE) {
       found = false;
     }
-    app_info_destroy(info);
   }
-  app_info_filter_destroy(handle);
   return found;
 }
 
@@ -393,18 +411,18 @@ void LauncherPackageManager::LoadDeactivatedAppList() {
 
 std::vector<std::string> LauncherPackageManager::_GetDeactivatedAppIds() {
   std::vector<std::string> appIds;
-  package_manager_filter_h filter = NULL;
-  if (package_manager_filter_create(&filter) != PACKAGE_MANAGER_ERROR_NONE || filter == NULL) {
+  PackageFilter filter;
+  if (package_manager_filter_create(filter.Out()) != PACKAGE_MANAGER_ERROR_NONE ||
+      filter.Get() == NULL) {
     return appIds;
   }
-  if (package_manager_filter_add_bool(filter, PACKAGE_MANAGER_PKGINFO_PROP_SUPPORT_DISABLE,
+  if (package_manager_filter_add_bool(filter.Get(), PACKAGE_MANAGER_PKGINFO_PROP_SUPPORT_DISABLE,
                                       true) == PACKAGE_MANAGER_ERROR_NONE &&
-      package_manager_filter_add_bool(filter, PACKAGE_MANAGER_PKGINFO_PROP_DISABLE, true) ==
+      package_manager_filter_add_bool(filter.Get(), PACKAGE_MANAGER_PKGINFO_PROP_DISABLE, true) ==
           PACKAGE_MANAGER_ERROR_NONE) {
-    package_manager_filter_foreach_package_info(filter, _PkgMgrDeactivatedPackageInfoGetListCb,
-                                                &appIds);
+    package_manager_filter_foreach_package_info(filter.Get(),
+                                                _PkgMgrDeactivatedPackageInfoGetListCb, &appIds);
   }
-  package_manager_filter_destroy(filter);
   return appIds;
 }
 
@@ -419,54 +437,50 @@ bool LauncherPackageManager::_PkgMgrDeactivatedPackageInfoGetListCb(package_info
 
 bool LauncherPackageManager::_PkgMgrDeactivatedAppInfoGetListCb(
     package_info_app_component_type_e, const char* appId, void* user_data) {
-  app_info_h info = NULL;
-  if (app_info_create(appId, &info) != APP_MANAGER_ERROR_NONE) return true;
+  AppInfo info;
+  if (app_info_create(appId, info.Out()) != APP_MANAGER_ERROR_NONE) return true;
   bool isNoDisplay = false;
-  app_info_is_nodisplay(info, &isNoDisplay);
+  app_info_is_nodisplay(info.Get(), &isNoDisplay);
   if (!isNoDisplay) {
     PlatformText id;
-    if (app_info_get_app_id(info, id.Out()) == APP_MANAGER_ERROR_NONE && id.Get() != NULL) {
+    if (app_info_get_app_id(info.Get(), id.Out()) == APP_MANAGER_ERROR_NONE && id.Get() != NULL) {
       StringList(user_data)->push_back(id.Get());
     }
   }
-  app_info_destroy(info);
   return true;
 }
 
 bool LauncherPackageManager::_GetDeactivatedAppInfo(std::string appId,
                                                     boost::shared_ptr<GameBoxData> box) {
-  app_info_filter_h filter = NULL;
-  if (app_info_filter_create(&filter) != APP_MANAGER_ERROR_NONE) return false;
+  AppInfoFilter filter;
+  if (app_info_filter_create(filter.Out()) != APP_MANAGER_ERROR_NONE) return false;
   std::vector<std::string> texts;  // package id, icon path, label
-  if (app_info_filter_add_string(filter, PACKAGE_INFO_PROP_APP_ID, appId.c_str()) !=
+  if (app_info_filter_add_string(filter.Get(), PACKAGE_INFO_PROP_APP_ID, appId.c_str()) !=
           APP_MANAGER_ERROR_NONE ||
-      app_info_filter_foreach_appinfo(filter, _PkgMgrDeactivatedAppInfoGetCb, &texts) !=
+      app_info_filter_foreach_appinfo(filter.Get(), _PkgMgrDeactivatedAppInfoGetCb, &texts) !=
           APP_MANAGER_ERROR_NONE ||
       texts.size() != 3) {
-    app_info_filter_destroy(filter);
     return false;
   }
   box->pkgId = texts[0];
   box->iconPath = texts[1];
   box->name = texts[2];
-  _GetDeactivatedPkgInfo(appId, box);
-  app_info_filter_destroy(filter);
+  _GetDeactivatedPkgInfo(appId, box);  // before this filter goes, as the launcher does
   return true;
 }
 
 bool LauncherPackageManager::_GetDeactivatedPkgInfo(std::string appId,
                                                     boost::shared_ptr<GameBoxData> box) {
-  app_info_filter_h filter = NULL;
-  if (app_info_filter_create(&filter) != APP_MANAGER_ERROR_NONE) return false;
+  AppInfoFilter filter;
+  if (app_info_filter_create(filter.Out()) != APP_MANAGER_ERROR_NONE) return false;
   std::vector<std::string> texts;  // the type
   bool read =
-      app_info_filter_add_string(filter, PACKAGE_INFO_PROP_APP_ID, appId.c_str()) ==
+      app_info_filter_add_string(filter.Get(), PACKAGE_INFO_PROP_APP_ID, appId.c_str()) ==
           APP_MANAGER_ERROR_NONE &&
-      app_info_filter_foreach_appinfo(filter, _PkgMgrDeactivatedPkgInfoGetCb, &texts) ==
+      app_info_filter_foreach_appinfo(filter.Get(), _PkgMgrDeactivatedPkgInfoGetCb, &texts) ==
           APP_MANAGER_ERROR_NONE &&
       texts.size() == 1;
   if (read) box->pkgType = texts[0];
-  app_info_filter_destroy(filter);
   return read;
 }
 
