@@ -144,9 +144,9 @@ std::string Join(const Words& words, const char* between) {
 // ---- The arguments of one call, read in order. Each is named, in messages,
 // by its placeholder in the operation's syntax.
 
-class Args {
+class CallArgs {
  public:
-  Args(const Words& words, const std::string& syntax) : m_words(words), m_next(1) {
+  CallArgs(const Words& words, const std::string& syntax) : m_words(words), m_next(1) {
     std::istringstream placeholders(syntax);
     for (std::string name; placeholders >> name;) {
       if (name.front() == '[') name = name.substr(1, name.size() - 2);
@@ -218,16 +218,16 @@ class Args {
 // How a parameter of each type is read.
 template <class T>
 struct Tag {};
-int Read(Args& a, Tag<int>) { return a.Int(); }
-unsigned int Read(Args& a, Tag<unsigned int>) { return a.Unsigned(); }
-bool Read(Args& a, Tag<bool>) { return a.Bool(); }
-std::string Read(Args& a, Tag<std::string>) { return a.Text(); }
-const char* Read(Args& a, Tag<const char*>) { return a.CText(); }
-GameViewData Read(Args& a, Tag<GameViewData>) { return a.Record(kMenu); }
-GamePageData Read(Args& a, Tag<GamePageData>) { return a.Record(kPage); }
-GameBoxData Read(Args& a, Tag<GameBoxData>) { return a.Record(kBox); }
-BoxPtr Read(Args& a, Tag<BoxPtr>) { return a.Box(); }
-Words Read(Args& a, Tag<Words>) { return a.Rest(); }
+int Read(CallArgs& a, Tag<int>) { return a.Int(); }
+unsigned int Read(CallArgs& a, Tag<unsigned int>) { return a.Unsigned(); }
+bool Read(CallArgs& a, Tag<bool>) { return a.Bool(); }
+std::string Read(CallArgs& a, Tag<std::string>) { return a.Text(); }
+const char* Read(CallArgs& a, Tag<const char*>) { return a.CText(); }
+GameViewData Read(CallArgs& a, Tag<GameViewData>) { return a.Record(kMenu); }
+GamePageData Read(CallArgs& a, Tag<GamePageData>) { return a.Record(kPage); }
+GameBoxData Read(CallArgs& a, Tag<GameBoxData>) { return a.Record(kBox); }
+BoxPtr Read(CallArgs& a, Tag<BoxPtr>) { return a.Box(); }
+Words Read(CallArgs& a, Tag<Words>) { return a.Rest(); }
 
 // ---- Results.
 
@@ -277,7 +277,7 @@ void ShowHandedBack(std::ostream& out, const V& value) {
 }
 
 template <class R, class... P, class F>
-void Run(Args& a, std::ostream& out, F call) {
+void Run(CallArgs& a, std::ostream& out, F call) {
   std::tuple<std::decay_t<P>...> values{Read(a, Tag<std::decay_t<P> >())...};
   a.End();
   if constexpr (std::is_void_v<R>) {
@@ -289,17 +289,17 @@ void Run(Args& a, std::ostream& out, F call) {
 }
 
 template <class C, class R, class... P>
-void Invoke(R (C::*operation)(P...), Args& a, std::ostream& out) {
+void Invoke(R (C::*operation)(P...), CallArgs& a, std::ostream& out) {
   Run<R, P...>(a, out, [&](auto&... v) { return (Instance<C>().*operation)(v...); });
 }
 
 template <class R, class... P>
-void Invoke(R (*operation)(P...), Args& a, std::ostream& out) {
+void Invoke(R (*operation)(P...), CallArgs& a, std::ostream& out) {
   Run<R, P...>(a, out, [&](auto&... v) { return operation(v...); });
 }
 
 template <auto operation>
-void Bound(Args& a, std::ostream& out) {
+void Bound(CallArgs& a, std::ostream& out) {
   Invoke(operation, a, out);
 }
 
@@ -348,7 +348,7 @@ void ShowUserData(std::ostream&, TheTracker) {}
 // A callback on a handle opened for the one argument (an id), with a fresh U
 // as its user data, printed after the result.
 template <class Open, bool (*callback)(typename Open::Type, void*), class U>
-void OnHandle(Args& a, std::ostream& out) {
+void OnHandle(CallArgs& a, std::ostream& out) {
   std::string id = a.Text();
   a.End();
   Open handle(id);
@@ -361,7 +361,7 @@ void OnHandle(Args& a, std::ostream& out) {
 // A package's application callback: COMPONENT APPID, the ids it collects
 // printed after the result.
 template <bool (*callback)(package_info_app_component_type_e, const char*, void*)>
-void OnPackageApp(Args& a, std::ostream& out) {
+void OnPackageApp(CallArgs& a, std::ostream& out) {
   int component = a.Choice(kComponentNames, true);
   const char* id = a.CText();
   a.End();
@@ -374,7 +374,7 @@ void OnPackageApp(Args& a, std::ostream& out) {
 // to the platform's callback or |direct|ly to the tracker. Values outside the
 // enums go on as the platform passes them: converted where they are passed,
 // never held in a variable of the enum's type (loading one is undefined).
-void OnEvent(Args& a, bool direct) {
+void OnEvent(CallArgs& a, bool direct) {
   const char* type = a.CText();
   const char* package = a.CText();
   int eventType = a.Choice(kEventTypeNames, true);
@@ -413,7 +413,7 @@ struct Operation {
   const char* name;
   const char* args;
   const char* help;
-  void (*run)(Args& a, std::ostream& out);
+  void (*run)(CallArgs& a, std::ostream& out);
   // Whether the words are meant for this overload; null when there is one.
   bool (*shape)(const Words& words) = nullptr;
 };
@@ -438,7 +438,7 @@ const Operation kOperations[] = {
     // ---- The layout store.
     {kStore, "Initialize", "",
      "Opens the store; on first launch lays out menu \"Apps\" with the games the tracker lists.",
-     [](Args& a, std::ostream& out) {
+     [](CallArgs& a, std::ostream& out) {
        a.End();
        Show(out, Instance<Store_>().Initialize(Tracker()));
      }},
@@ -472,7 +472,7 @@ const Operation kOperations[] = {
     STORE(GetMenuBoxData, "BOXID", "The box, or a record with boxId 0."),
     {kStore, "GetBoxIdByAppId", "APPID",
      "Finds the application's box: its parentId, pageId and boxId (0 when not found).",
-     [](Args& a, std::ostream& out) {
+     [](CallArgs& a, std::ostream& out) {
        std::string appId = a.Text();
        a.End();
        int parentId = 0, pageId = 0, boxId = 0;
@@ -493,7 +493,7 @@ const Operation kOperations[] = {
     {kStore, "InsertBoxData", "APPID",
      "Places a box for APPID (a word without '=') after the last box of menu 1; prints the "
      "boxId (or -1) and pageAdded.",
-     [](Args& a, std::ostream& out) {
+     [](CallArgs& a, std::ostream& out) {
        std::string appId = a.Text();
        a.End();
        bool pageAdded = false;
@@ -525,7 +525,7 @@ const Operation kOperations[] = {
     // ---- The package tracker.
     {kTracker, "Initialize", "print|empty",
      "Sets the five callbacks: print ones say when they fire, empty ones throw.",
-     [](Args& a, std::ostream& out) {
+     [](CallArgs& a, std::ostream& out) {
        bool print = a.Choice({"print", "empty"}) == 0;
        a.End();
        if (!print) return Show(out, Tracker().Initialize({}, {}, {}, {}, {}));
@@ -537,15 +537,15 @@ const Operation kOperations[] = {
      "A package event as the platform sends it, the tracker as user data. EVENT_TYPE: "
      "install|uninstall|update, STATE: started|processing|completed|failed, either by name "
      "or as an integer; TYPE and PKG may be (null).",
-     [](Args& a, std::ostream&) { OnEvent(a, false); }},
+     [](CallArgs& a, std::ostream&) { OnEvent(a, false); }},
     {kTracker, "OnClientListenCb", "TYPE PKG EVENT_TYPE STATE PROGRESS ERROR",
      "The same event handed to the tracker directly.",
-     [](Args& a, std::ostream&) { OnEvent(a, true); }},
+     [](CallArgs& a, std::ostream&) { OnEvent(a, true); }},
     TRACKER(PauseListenCb, "", "Holds completed package jobs back."),
     TRACKER(StartListenCb, "", "Processes the held jobs and stops holding back."),
     {kTracker, "_DoPkgJob", "TYPE PKGID [APPID...]",
      "Turns a completed job into callbacks; TYPE: none|install|uninstall|update or an integer.",
-     [](Args& a, std::ostream& out) {
+     [](CallArgs& a, std::ostream& out) {
        boost::shared_ptr<Tracker_::PkgData> job(new Tracker_::PkgData);
        job->type = static_cast<Tracker_::PkgJobType>(a.Choice(kJobTypes, true));
        job->pkgId = a.Text();
@@ -561,7 +561,7 @@ const Operation kOperations[] = {
             "Records the card status (0: none) and announces the cached applications on it."),
     {kTracker, "_BootingDoneSignalCb", "[manager|(null)]",
      "The boot-done handler, with the tracker or (by default) null as data.",
-     [](Args& a, std::ostream&) {
+     [](CallArgs& a, std::ostream&) {
        bool manager = a.More() && a.Choice({"manager", "(null)"}) == 0;
        a.End();
        Tracker_::_BootingDoneSignalCb(manager ? &Tracker() : NULL, NULL);
@@ -575,7 +575,7 @@ const Operation kOperations[] = {
      [](const Words& w) { return !FirstIs(w, "--handle"); }},
     {kTracker, "_GetAppInfo", "--handle APPID [BOX...]",
      "The same from a handle opened with app_info_create(APPID).",
-     [](Args& a, std::ostream& out) {
+     [](CallArgs& a, std::ostream& out) {
        a.Text();  // --handle
        std::string appId = a.Text();
        BoxPtr box = a.Box();
@@ -602,7 +602,7 @@ const Operation kOperations[] = {
      OnHandle<AppHandle, Tracker_::_has_mini_app_cb, bool>},
     {kTracker, "_app_metadata_list_cb", "KEY VALUE",
      "The menu-launch metadata callback; prints its flag.",
-     [](Args& a, std::ostream& out) {
+     [](CallArgs& a, std::ostream& out) {
        const char* key = a.CText();
        const char* value = a.CText();
        a.End();
@@ -642,7 +642,7 @@ const Operation kOperations[] = {
      Bound<static_cast<std::string (*)(int)>(&Korrin3D::to_string)>,
      [](const Words& w) { return !FirstIs(w, "--unsigned"); }},
     {kText, "to_string", "--unsigned N", "N (0..4294967295) in decimal as a signed number.",
-     [](Args& a, std::ostream& out) {
+     [](CallArgs& a, std::ostream& out) {
        a.Text();  // --unsigned
        Invoke(static_cast<std::string (*)(unsigned int)>(&Korrin3D::to_string), a, out);
      },
@@ -718,7 +718,7 @@ void Call(const std::vector<std::string>& words, std::ostream& out) {
       break;
     }
   }
-  Args args(words, op->args);
+  CallArgs args(words, op->args);
   try {
     op->run(args, out);
   } catch (const UsageError& e) {
