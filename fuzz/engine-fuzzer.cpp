@@ -30,8 +30,8 @@ void Die(const std::string& message) {
   abort();
 }
 
-// Views tell nothing of the engine; layout and folder draw a hostile layout (a
-// box at row 2^31, a folder in itself) for ever, trace keeps SQL across inputs.
+// Views (tables, trace) tell nothing of the engine; layout and folder draw a
+// hostile layout (a box at row 2^31, a folder in itself) for ever.
 // A release made to fail leaves its handle open for good. (Names are never quoted.)
 std::string Refused(std::string line) {
   std::istringstream words(line);

@@ -295,7 +295,6 @@ std::vector<std::string> LauncherPackageManager::_GetAppIds(const char* pkgId) {
     if (package_manager_get_package_info(pkgId, pkgInfo.Out()) != PACKAGE_MANAGER_ERROR_NONE) {
       KLOG(DLOG_ERROR, "package_manager_get_package_info[%s] != PACKAGE_MANAGER_ERROR_NONE",
            pkgId != NULL ? pkgId : "(null)");
-      pkgInfo.Forget();
     } else if (package_info_foreach_app_from_package(pkgInfo.Get(), PACKAGE_INFO_UIAPP,
                                                      _PkgMgrAppInfoGetListCb, &appIds) !=
                PACKAGE_MANAGER_ERROR_NONE) {

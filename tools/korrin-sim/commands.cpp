@@ -1,7 +1,6 @@
 #include "commands.h"
 
 #include <package_manager.h>
-#include <sqlite3.h>
 
 #include <algorithm>
 #include <sstream>
@@ -358,23 +357,12 @@ void RunCount(Session&, const Args& args) {
   for (size_t i = 0; i < calls.size(); ++i) Out() << calls[i] << " " << counts[i] << "\n";
 }
 
-// `trace`: the statements the store's connection runs, as SQLite received them.
-bool g_tracing = false;
-std::vector<std::string> g_statements;  // since the last `trace`
-
-int RecordStatement(unsigned, void*, void*, void* text) {
-  g_statements.push_back(static_cast<const char*>(text));
-  return 0;
-}
-
-void RunTrace(Session&, const Args& args) {
+void RunTrace(Session& session, const Args& args) {
   if (args.Has("on|off")) {
-    g_tracing = ParseNamed(args.Text("on|off"), {"off", "on"}, "on|off") != 0;
-    FollowStoreTrace();
+    session.Trace(ParseNamed(args.Text("on|off"), {"off", "on"}, "on|off") != 0);
   } else {
-    for (const std::string& sql : g_statements) Out() << sql << "\n";
+    for (const std::string& sql : session.TakeStatements()) Out() << sql << "\n";
   }
-  g_statements.clear();
 }
 
 void RunSampleDevice(Session&, const Args&) { Dev().LoadSampleDevice(); }
@@ -693,13 +681,6 @@ std::string Args::Text(const std::string& name) const {
 std::vector<std::string> Args::List(const std::string& name) const {
   return Has(name) ? values_[name].as<std::vector<std::string> >()
                    : std::vector<std::string>();
-}
-
-void FollowStoreTrace() {
-  sqlite3* db = korrin::DataManager().m_db;
-  if (db == NULL) return;
-  sqlite3_trace_v2(db, g_tracing ? SQLITE_TRACE_STMT : 0, g_tracing ? RecordStatement : NULL,
-                   NULL);
 }
 
 const std::vector<Command>& Commands() {

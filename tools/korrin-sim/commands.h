@@ -57,8 +57,6 @@ struct Command {
 const std::vector<Command>& Commands();
 // The command, or null.
 const Command* FindCommand(const std::string& name);
-// Points `trace` at the store's connection of the moment, which `start` replaces.
-void FollowStoreTrace();
 
 }  // namespace korrin_sim
 

@@ -5,6 +5,8 @@
 #include <sstream>
 #include <utility>
 
+#include <sqlite3.h>
+
 #include <boost/program_options.hpp>
 #include <dtl/dtl.hpp>
 
@@ -12,6 +14,7 @@
 #include "cli.h"
 #include "commands.h"
 #include "common/device-path.h"
+#include "korrin-data/korrin-data.h"
 
 namespace po = boost::program_options;
 
@@ -155,7 +158,39 @@ bool IsComment(const std::string& line) {
 }  // namespace
 
 Session::Session(bool printActions, bool recordChanges)
-    : printActions_(printActions), recordChanges_(recordChanges), logMark_(0) {}
+    : printActions_(printActions), recordChanges_(recordChanges), tracing_(false), logMark_(0) {}
+
+Session::~Session() {
+  if (tracing_) Trace(false);  // the connection outlives the session
+}
+
+namespace {
+
+int KeepStatement(unsigned, void* statements, void*, void* text) {
+  static_cast<std::vector<std::string>*>(statements)->push_back(static_cast<const char*>(text));
+  return 0;
+}
+
+}  // namespace
+
+void Session::Trace(bool on) {
+  tracing_ = on;
+  statements_.clear();
+  FollowStoreTrace();
+}
+
+std::vector<std::string> Session::TakeStatements() {
+  std::vector<std::string> taken;
+  taken.swap(statements_);
+  return taken;
+}
+
+void Session::FollowStoreTrace() {
+  sqlite3* db = korrin::DataManager().m_db;
+  if (db == NULL) return;
+  sqlite3_trace_v2(db, tracing_ ? SQLITE_TRACE_STMT : 0, tracing_ ? KeepStatement : NULL,
+                   &statements_);
+}
 
 std::string Session::DatabasePath() const { return korrin::DevicePath(korrin::kGameDataDbPath); }
 

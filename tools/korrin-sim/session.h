@@ -28,10 +28,16 @@ class Session {
   // |recordChanges| false spares the two reads of the whole database around
   // each such command, for drivers that never show `changes`.
   explicit Session(bool printActions = true, bool recordChanges = true);
+  ~Session();
 
   // Runs one command line (comments and blank lines do nothing). Throws
   // UsageError, having changed nothing, when it cannot run as written.
   void Execute(const std::string& line);
+  // `trace`: while on, the statements the store's connection runs are kept
+  // until taken. Switching it on or off forgets those kept.
+  void Trace(bool on);
+  std::vector<std::string> TakeStatements();
+
   // Checks that |line| (not blank) would run, changing nothing.
   void Check(const std::string& line) const { Prepare(line); }
   // Compares the lines of an `expect` block with what the last command
@@ -68,9 +74,17 @@ class Session {
   Prepared Prepare(const std::string& line) const;
   // Has the first line waiting for |call| run when the engine next makes it.
   void ArmBefore(const std::string& call);
+  // Points the trace at the store's connection of the moment: `start` opens
+  // a new one.
+  void FollowStoreTrace();
+
+  Session(const Session&) = delete;
+  Session& operator=(const Session&) = delete;
 
   bool printActions_;
   bool recordChanges_;
+  bool tracing_;
+  std::vector<std::string> statements_;  // traced, not yet taken
   // The error of a `before` line, raised inside a platform call: kept until
   // the command around it returns, so that it never unwinds the engine.
   std::exception_ptr beforeError_;
