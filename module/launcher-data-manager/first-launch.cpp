@@ -10,6 +10,7 @@
 #include "launcher-data-manager/launcher-data-manager.h"
 
 #include "common/log.h"
+#include "launcher-data-manager/store-internal.h"
 #include "launcher-package-manager/launcher-package-manager.h"
 
 bool LauncherDataManager::Initialize(LauncherPackageManager& pkgMgr) {
@@ -35,11 +36,12 @@ bool LauncherDataManager::Initialize(LauncherPackageManager& pkgMgr) {
   int menuId = InsertMenuData(menu);  // a failure leaves -1 as the pages' parent
   if (appIds.empty()) return true;
 
-  int col = 1;
-  int row = 1;
+  // The cursor wraps to row 1 of the same page number: every page begun here
+  // is numbered 1.
+  korrin::GridCursor cursor(korrin::MenuGrid(*this), korrin::GridCursor::kWrap);
   int pageId = 1;
   for (size_t i = 0; i < appIds.size(); ++i) {
-    if (col == 1 && row == 1) {
+    if (cursor.AtFirstCell()) {
       GamePageData page;
       page.isFolder = false;
       page.parentId = menuId;
@@ -49,13 +51,10 @@ bool LauncherDataManager::Initialize(LauncherPackageManager& pkgMgr) {
     GameBoxData box;
     box.appId = appIds[i];
     box.pageId = pageId;
-    box.col = col;
-    box.row = row;
+    box.col = cursor.col();
+    box.row = cursor.row();
     InsertBoxData(box);
-    if (++col > m_columns) {
-      col = 1;
-      if (++row > m_maxRows) row = 1;
-    }
+    cursor.Advance();
   }
   return true;
 }

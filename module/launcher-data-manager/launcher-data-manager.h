@@ -193,10 +193,11 @@ class LauncherDataManager {
   // Bookkeeping of the virtual pages handed out by the computed views.
   std::map<int, int> m_pageMap;       // virtual pageId -> parentId
   std::map<int, bool> m_pageFlagMap;  // virtual pageId -> isFolder
-  // Grid limits, fixed for the life of the store.
+  // The menu grid, fixed for the life of the store (grid.h walks it).
   int m_maxRows;          // rows of a menu page before a new page begins
   int m_columns;          // boxes in a row
-  int m_maxBoxesPerPage;  // m_maxRows * m_columns
+  int m_maxBoxesPerPage;  // m_maxRows * m_columns; kept for the launcher, the
+                          // grid counts pages from the two above
 };
 
 #endif  // KORRIN_LAUNCHER_DATA_MANAGER_LAUNCHER_DATA_MANAGER_H_

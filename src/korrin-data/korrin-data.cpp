@@ -11,6 +11,7 @@
 #include <algorithm>
 
 #include "common/log.h"
+#include "launcher-data-manager/grid.h"
 
 typedef boost::shared_ptr<GameBoxData> BoxPtr;
 
@@ -18,10 +19,6 @@ namespace {
 
 LauncherDataManager g_dataManager;
 LauncherPackageManager g_packageManager;
-
-// The uninstall compaction lays every page out four wide, folder pages too,
-// with no row limit; kept as the launcher expects it.
-const int kCompactionColumns = 4;
 
 std::string AppIdText(const char* appId) { return appId != NULL ? appId : ""; }
 
@@ -99,16 +96,12 @@ void _removeShortcut(const std::string& appId, std::vector<int>& pages) {
 // Rewrites every box left on the page from its first cell, in reading order.
 void CloseGaps(int pageId) {
   std::vector<BoxPtr> boxes = g_dataManager.GetBoxDataList(pageId);
-  int col = 1;
-  int row = 1;
+  korrin::GridCursor cursor(korrin::kCompactionGrid, korrin::GridCursor::kStop);
   for (size_t i = 0; i < boxes.size(); ++i) {
-    boxes[i]->col = col;
-    boxes[i]->row = row;
+    boxes[i]->col = cursor.col();
+    boxes[i]->row = cursor.row();
     g_dataManager.UpdateBoxData(*boxes[i]);
-    if (++col > kCompactionColumns) {
-      col = 1;
-      ++row;
-    }
+    cursor.Advance();
   }
 }
 
