@@ -106,6 +106,43 @@ int AlphabeticalPageId(int parentId, bool isFolder, int k) {
   return isFolder ? korrin::FolderVirtualPageId(parentId, k) : korrin::VirtualPageId(k);
 }
 
+// Where a box was dropped in the alphabetical view.
+struct DropTarget {
+  int parentId;
+  bool isFolder;
+};
+
+// A virtual page handed out by the page listing, else a stored page, else the
+// parent the caller names. A miss leaves an empty entry in both maps, as the
+// launcher has always done.
+DropTarget FindDropTarget(LauncherDataManager& store, const GameBoxData& box) {
+  DropTarget target = {store.m_pageMap[box.pageId], store.m_pageFlagMap[box.pageId]};
+  if (target.parentId != 0) return target;
+  PagePtr dropped = store.GetMenuPageData(box.pageId);
+  if (dropped->pageId != 0) {
+    target.parentId = dropped->parentId;
+    target.isFolder = false;
+  } else {
+    KLOG(DLOG_ERROR, "No page [%d]", box.pageId);
+    target.parentId = box.parentId;
+    // Menus have small ids; a parent above 5 is taken for a folder box.
+    target.isFolder = box.parentId > 5;
+  }
+  return target;
+}
+
+// Dropped within its own parent, a box only takes its new name.
+void RenameBox(sqlite3* db, const GameBoxData& box) {
+  korrin::SqlText sql;
+  sql << "UPDATE boxes set "
+      << "name = $name "
+      << " WHERE boxId = " << box.boxId;
+  Statement rename(db, sql.str(), kPrepareV2);
+  // Like every update, an empty name is stored as NULL.
+  rename.BindTextIfNotEmpty("$name", box.name);
+  rename.Step();
+}
+
 }  // namespace
 
 std::vector<BoxPtr> LauncherDataManager::GetBoxDataListByAlphabeticalOrder(int parentId,
@@ -202,40 +239,16 @@ int LauncherDataManager::UpdateBoxDataForAlphaBeticalOrder(GameBoxData& box) {
     return 0;
   }
 
-  // Where the box was dropped: a virtual page handed out by the page listing,
-  // else a stored page, else the parent the caller names. A miss leaves an
-  // empty entry in both maps, as the launcher has always done.
-  int targetParent = m_pageMap[box.pageId];
-  bool targetIsFolder = m_pageFlagMap[box.pageId];
-  if (targetParent == 0) {
-    PagePtr dropped = GetMenuPageData(box.pageId);
-    if (dropped->pageId != 0) {
-      targetParent = dropped->parentId;
-      targetIsFolder = false;
-    } else {
-      KLOG(DLOG_ERROR, "No page [%d]", box.pageId);
-      targetParent = box.parentId;
-      // Menus have small ids; a parent above 5 is taken for a folder box.
-      targetIsFolder = box.parentId > 5;
-    }
-  }
-
-  if (targetParent == oldPage->parentId) {
-    korrin::SqlText sql;
-    sql << "UPDATE boxes set "
-        << "name = $name "
-        << " WHERE boxId = " << box.boxId;
-    Statement rename(m_db, sql.str(), kPrepareV2);
-    // Like every update, an empty name is stored as NULL.
-    rename.BindTextIfNotEmpty("$name", box.name);
-    rename.Step();
+  DropTarget target = FindDropTarget(*this, box);
+  if (target.parentId == oldPage->parentId) {
+    RenameBox(m_db, box);
     return 0;
   }
 
   Cell cell;
   bool pageAdded = false;  // not reported to this caller
-  Grid grid = korrin::ParentGrid(korrin::MenuGrid(*this), targetIsFolder);
-  if (!FindCellAfterLastBox(*this, box.parentId, targetIsFolder, grid, &cell, &pageAdded)) {
+  Grid grid = korrin::ParentGrid(korrin::MenuGrid(*this), target.isFolder);
+  if (!FindCellAfterLastBox(*this, box.parentId, target.isFolder, grid, &cell, &pageAdded)) {
     return 0;
   }
   box.pageId = cell.pageId;

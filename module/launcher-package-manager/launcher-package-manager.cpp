@@ -80,6 +80,65 @@ std::vector<std::string>* StringList(void* user_data) {
   return static_cast<std::vector<std::string>*>(user_data);
 }
 
+// What _GetAppInfo reads of an application and of its package.
+struct AppFacts {
+  AppFacts()
+      : isNoDisplay(false), isEnabled(true), isRemovable(true), isPreload(false),
+        isSystem(false) {}
+  PlatformText appId, pkgId, icon, label, type;
+  bool isNoDisplay;
+  bool isEnabled;
+  bool isRemovable;
+  bool isPreload;
+  bool isSystem;
+};
+
+// Reads the package's flags into |facts|; the first failure is logged and ends
+// the reading. The package's handle is released before the verdict.
+bool ReadPackageFlags(AppFacts* facts) {
+  PackageInfo pkgInfo;
+  int rc = package_info_create(facts->pkgId.Get(), pkgInfo.Out());
+  if (rc != PACKAGE_MANAGER_ERROR_NONE) {
+    // Names the package manager's call, not the one made; kept.
+    KLOG(DLOG_ERROR, "package_manager_get_package_info return [%d]", rc);
+    pkgInfo.Forget();
+    return false;
+  }
+  if ((rc = package_info_is_system_package(pkgInfo.Get(), &facts->isSystem)) !=
+      PACKAGE_MANAGER_ERROR_NONE) {
+    KLOG(DLOG_ERROR, "package_info_is_system_package return [%d]", rc);
+    return false;
+  }
+  if ((rc = package_info_is_removable_package(pkgInfo.Get(), &facts->isRemovable)) !=
+      PACKAGE_MANAGER_ERROR_NONE) {
+    KLOG(DLOG_ERROR, "package_info_is_removable_package return [%d]", rc);
+    return false;
+  }
+  if ((rc = package_info_is_preload_package(pkgInfo.Get(), &facts->isPreload)) !=
+      PACKAGE_MANAGER_ERROR_NONE) {
+    KLOG(DLOG_ERROR, "package_info_is_preload_package return [%d]", rc);
+    return false;
+  }
+  return true;
+}
+
+// Writes what was read into the box; a text the platform did not give keeps
+// the box's own, but for the icon, which falls back to the default.
+void FillBox(const AppFacts& facts, GameBoxData* box) {
+  if (facts.pkgId.Get() != NULL) box->pkgId = facts.pkgId.Get();
+  if (facts.type.Get() != NULL) box->pkgType = facts.type.Get();
+  box->iconPath = facts.icon.IsEmpty() ? kDefaultIconPath : facts.icon.Get();
+  if (facts.appId.Get() != NULL) box->appId = facts.appId.Get();
+  if (facts.label.Get() != NULL) box->name = facts.label.Get();
+  box->isNoDisplay = facts.isNoDisplay;
+  box->isEnabled = facts.isEnabled;
+  box->isRemovable = facts.isRemovable;
+  box->isPreload = facts.isPreload;
+  box->isSystem = facts.isSystem;
+  box->appSize = 0;
+  box->isMdmRestricted = false;
+}
+
 }  // namespace
 
 // ---------------------------------------------------------------------------
@@ -168,73 +227,41 @@ bool LauncherPackageManager::_GetAppInfo(std::string appId, boost::shared_ptr<Ga
 }
 
 bool LauncherPackageManager::_GetAppInfo(app_info_h& info, boost::shared_ptr<GameBoxData> box) {
-  PlatformText appId, pkgId, icon, label, type;
-  bool isNoDisplay = false;
-  bool isEnabled = true;
-  bool isRemovable = true;
-  bool isPreload = false;
-  bool isSystem = false;
+  AppFacts facts;
   bool read = false;
 
   // Each read runs only when the ones before it succeeded.
   int rc;
-  if ((rc = app_info_get_app_id(info, appId.Out())) != APP_MANAGER_ERROR_NONE) {
+  if ((rc = app_info_get_app_id(info, facts.appId.Out())) != APP_MANAGER_ERROR_NONE) {
     KLOG(DLOG_ERROR, "app_info_get_app_id return [%d]", rc);
-  } else if ((rc = app_info_is_nodisplay(info, &isNoDisplay)) != APP_MANAGER_ERROR_NONE) {
+  } else if ((rc = app_info_is_nodisplay(info, &facts.isNoDisplay)) != APP_MANAGER_ERROR_NONE) {
     KLOG(DLOG_ERROR, "app_info_is_nodisplay return [%d]", rc);
-  } else if (isNoDisplay) {
-    KLOG(DLOG_ERROR, "app[%s] is nodisplay app", appId.ForLog());
+  } else if (facts.isNoDisplay) {
+    KLOG(DLOG_ERROR, "app[%s] is nodisplay app", facts.appId.ForLog());
     return false;
-  } else if ((rc = app_info_get_package(info, pkgId.Out())) != APP_MANAGER_ERROR_NONE) {
+  } else if ((rc = app_info_get_package(info, facts.pkgId.Out())) != APP_MANAGER_ERROR_NONE) {
     KLOG(DLOG_ERROR, "app_info_get_package return [%d]", rc);
-  } else if ((rc = app_info_get_icon(info, icon.Out())) != APP_MANAGER_ERROR_NONE) {
+  } else if ((rc = app_info_get_icon(info, facts.icon.Out())) != APP_MANAGER_ERROR_NONE) {
     KLOG(DLOG_ERROR, "app_info_get_icon return [%d]", rc);
-  } else if ((rc = app_info_get_label(info, label.Out())) != APP_MANAGER_ERROR_NONE) {
+  } else if ((rc = app_info_get_label(info, facts.label.Out())) != APP_MANAGER_ERROR_NONE) {
     KLOG(DLOG_ERROR, "app_info_get_label return [%d]", rc);
-  } else if ((rc = app_info_is_enabled(info, &isEnabled)) != APP_MANAGER_ERROR_NONE) {
+  } else if ((rc = app_info_is_enabled(info, &facts.isEnabled)) != APP_MANAGER_ERROR_NONE) {
     KLOG(DLOG_ERROR, "app_info_get_label return [%d]", rc);  // the label's text, kept
-  } else if ((rc = app_info_get_type(info, type.Out())) != APP_MANAGER_ERROR_NONE) {
+  } else if ((rc = app_info_get_type(info, facts.type.Out())) != APP_MANAGER_ERROR_NONE) {
     KLOG(DLOG_ERROR, "app_info_get_type return [%d]", rc);
   } else {
-    KLOG(DLOG_ERROR, " app_info_get_type appid[%s] pkg_id[%s] pkg_type[%s]", appId.ForLog(),
-         pkgId.ForLog(), type.ForLog());
-    // The first text names the package manager's call, not the one made; kept.
-    // The package's handle goes at the end of this branch, before the verdict.
-    PackageInfo pkgInfo;
-    if ((rc = package_info_create(pkgId.Get(), pkgInfo.Out())) != PACKAGE_MANAGER_ERROR_NONE) {
-      KLOG(DLOG_ERROR, "package_manager_get_package_info return [%d]", rc);
-      pkgInfo.Forget();
-    } else if ((rc = package_info_is_system_package(pkgInfo.Get(), &isSystem)) !=
-               PACKAGE_MANAGER_ERROR_NONE) {
-      KLOG(DLOG_ERROR, "package_info_is_system_package return [%d]", rc);
-    } else if ((rc = package_info_is_removable_package(pkgInfo.Get(), &isRemovable)) !=
-               PACKAGE_MANAGER_ERROR_NONE) {
-      KLOG(DLOG_ERROR, "package_info_is_removable_package return [%d]", rc);
-    } else if ((rc = package_info_is_preload_package(pkgInfo.Get(), &isPreload)) !=
-               PACKAGE_MANAGER_ERROR_NONE) {
-      KLOG(DLOG_ERROR, "package_info_is_preload_package return [%d]", rc);
-    } else {
-      read = true;
-    }
+    KLOG(DLOG_ERROR, " app_info_get_type appid[%s] pkg_id[%s] pkg_type[%s]", facts.appId.ForLog(),
+         facts.pkgId.ForLog(), facts.type.ForLog());
+    read = ReadPackageFlags(&facts);
   }
   if (!read) {
-    KLOG(DLOG_ERROR, "AppId[%s] failed to get pkginfo", appId.ForLog());
+    KLOG(DLOG_ERROR, "AppId[%s] failed to get pkginfo", facts.appId.ForLog());
     return false;
   }
 
-  if (pkgId.Get() != NULL) box->pkgId = pkgId.Get();
-  if (type.Get() != NULL) box->pkgType = type.Get();
-  box->iconPath = icon.IsEmpty() ? kDefaultIconPath : icon.Get();
-  if (appId.Get() != NULL) box->appId = appId.Get();
-  if (label.Get() != NULL) box->name = label.Get();
-  box->isNoDisplay = isNoDisplay;
-  box->isEnabled = isEnabled;
-  box->isRemovable = isRemovable;
-  box->isPreload = isPreload;
-  box->isSystem = isSystem;
-  box->appSize = 0;
-  box->isMdmRestricted = false;
-  KLOG(DLOG_ERROR, "Name[%s] enable[%d] system[%d]", label.ForLog(), isEnabled, isSystem);
+  FillBox(facts, box.get());
+  KLOG(DLOG_ERROR, "Name[%s] enable[%d] system[%d]", facts.label.ForLog(), facts.isEnabled,
+       facts.isSystem);
   m_appInfoCache[box->appId] = box;
   return true;
 }

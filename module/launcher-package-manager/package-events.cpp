@@ -26,6 +26,32 @@ int RawValue(const Enum& value) {
   return raw;
 }
 
+typedef LauncherPackageManager Tracker;
+
+// The job a started event opens. An uninstall lists the package's
+// applications now: once the package is gone they can no longer be asked for.
+boost::shared_ptr<Tracker::PkgData> NewJob(Tracker& manager, int eventType, const char* package) {
+  boost::shared_ptr<Tracker::PkgData> job(new Tracker::PkgData);
+  switch (eventType) {
+    case PACKAGE_MANAGER_EVENT_TYPE_INSTALL:
+      job->type = Tracker::PKG_JOB_INSTALL;
+      break;
+    case PACKAGE_MANAGER_EVENT_TYPE_UNINSTALL:
+      job->type = Tracker::PKG_JOB_UNINSTALL;
+      job->appIds = manager._GetAppIds(package);
+      break;
+    case PACKAGE_MANAGER_EVENT_TYPE_UPDATE:
+      job->type = Tracker::PKG_JOB_UPDATE;
+      break;
+    default:
+      job->type = Tracker::PKG_JOB_NONE;
+      KLOG(DLOG_ERROR, "Invalid event_type: %d\n", eventType);
+      break;
+  }
+  job->pkgId = package != NULL ? package : "";
+  return job;
+}
+
 }  // namespace
 
 bool LauncherPackageManager::Initialize(
@@ -67,29 +93,9 @@ void LauncherPackageManager::OnClientListenCb(const char*, const char* package,
   int eventState = RawValue(event_state);
 
   switch (eventState) {
-    case PACKAGE_MANAGER_EVENT_STATE_STARTED: {
-      boost::shared_ptr<PkgData> job(new PkgData);
-      switch (eventType) {
-        case PACKAGE_MANAGER_EVENT_TYPE_INSTALL:
-          job->type = PKG_JOB_INSTALL;
-          break;
-        case PACKAGE_MANAGER_EVENT_TYPE_UNINSTALL:
-          job->type = PKG_JOB_UNINSTALL;
-          // Once the package is gone its applications can no longer be asked for.
-          job->appIds = _GetAppIds(package);
-          break;
-        case PACKAGE_MANAGER_EVENT_TYPE_UPDATE:
-          job->type = PKG_JOB_UPDATE;
-          break;
-        default:
-          job->type = PKG_JOB_NONE;
-          KLOG(DLOG_ERROR, "Invalid event_type: %d\n", eventType);
-          break;
-      }
-      job->pkgId = pkgId;
-      m_pkgJobMap[pkgId] = job;  // a job still pending for the package is dropped
+    case PACKAGE_MANAGER_EVENT_STATE_STARTED:
+      m_pkgJobMap[pkgId] = NewJob(*this, eventType, package);  // a pending job is dropped
       break;
-    }
     case PACKAGE_MANAGER_EVENT_STATE_PROCESSING:
       break;
     case PACKAGE_MANAGER_EVENT_STATE_COMPLETED: {
