@@ -18,9 +18,6 @@ using korrin::Statement;
 using korrin::kPrepareLegacy;
 using korrin::kPrepareV2;
 
-typedef boost::shared_ptr<GamePageData> PagePtr;
-typedef boost::shared_ptr<GameBoxData> BoxPtr;
-
 namespace {
 
 // The k-th virtual page of a parent, remembered for the edits.

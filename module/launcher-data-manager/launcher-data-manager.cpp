@@ -19,10 +19,6 @@ using korrin::Statement;
 using korrin::kPrepareLegacy;
 using korrin::kPrepareV2;
 
-typedef boost::shared_ptr<GameViewData> MenuPtr;
-typedef boost::shared_ptr<GamePageData> PagePtr;
-typedef boost::shared_ptr<GameBoxData> BoxPtr;
-
 namespace {
 
 // The whole schema, run in one sqlite3_exec.

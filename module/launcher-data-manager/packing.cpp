@@ -9,10 +9,6 @@ using korrin::Cell;
 using korrin::Grid;
 using korrin::GridCursor;
 
-typedef boost::shared_ptr<GameViewData> MenuPtr;
-typedef boost::shared_ptr<GamePageData> PagePtr;
-typedef boost::shared_ptr<GameBoxData> BoxPtr;
-
 namespace {
 
 int InsertPage(LauncherDataManager& store, int parentId, bool isFolder, int pageNo) {

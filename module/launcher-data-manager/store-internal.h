@@ -7,6 +7,11 @@
 #include "launcher-data-manager/launcher-data-manager.h"
 #include "launcher-data-manager/statement.h"
 
+// The records the store hands out, shared with the caller.
+typedef boost::shared_ptr<GameViewData> MenuPtr;
+typedef boost::shared_ptr<GamePageData> PagePtr;
+typedef boost::shared_ptr<GameBoxData> BoxPtr;
+
 namespace korrin {
 
 // New applications always go to this menu.

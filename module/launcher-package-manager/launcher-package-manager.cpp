@@ -80,6 +80,20 @@ std::vector<std::string>* StringList(void* user_data) {
   return static_cast<std::vector<std::string>*>(user_data);
 }
 
+// A listing callback's two arguments: each missing one is logged, and the
+// callback then ends the listing.
+bool BothGiven(app_info_h info, void* user_data) {
+  if (info == NULL) {
+    KLOG(DLOG_ERROR, "(%s)", "NULL == handle");
+    return false;
+  }
+  if (user_data == NULL) {
+    KLOG(DLOG_ERROR, "(%s)", "NULL == user_data");
+    return false;
+  }
+  return true;
+}
+
 // What _GetAppInfo reads of an application and of its package.
 struct AppFacts {
   AppFacts()
@@ -295,14 +309,7 @@ bool LauncherPackageManager::GetAppIdList(std::vector<std::string>& appIds) {
 }
 
 bool LauncherPackageManager::_GetAllAppsInfoCb(app_info_h info, void* user_data) {
-  if (info == NULL) {
-    KLOG(DLOG_ERROR, "(%s)", "NULL == handle");
-    return false;
-  }
-  if (user_data == NULL) {
-    KLOG(DLOG_ERROR, "(%s)", "NULL == user_data");
-    return false;
-  }
+  if (!BothGiven(info, user_data)) return false;
   bool isGame = false;
   int rc = app_info_is_game(info, &isGame);
   if (rc != APP_MANAGER_ERROR_NONE || !isGame) {
@@ -400,14 +407,7 @@ bool LauncherPackageManager::_IsMenuLaunch(std::string appId) {
 }
 
 bool LauncherPackageManager::_has_mini_app_cb(app_info_h info, void* user_data) {
-  if (info == NULL) {
-    KLOG(DLOG_ERROR, "(%s)", "NULL == handle");
-    return false;
-  }
-  if (user_data == NULL) {
-    KLOG(DLOG_ERROR, "(%s)", "NULL == user_data");
-    return false;
-  }
+  if (!BothGiven(info, user_data)) return false;
   *static_cast<bool*>(user_data) = true;
   return false;
 }
