@@ -14,7 +14,8 @@
 #   scripts/dev.sh fuzz [SECONDS]
 #                             the fuzzer for SECONDS (default 600), keeping what it
 #                             finds in build-fuzz/work (or $KORRIN_FUZZ_WORK)
-# `test` also builds the fuzzer with clang and gives it a short, fixed run.
+# `test` also builds the fuzzer with clang and gives it a short, fixed run, and
+# checks the device package's spec (packaging/check-spec.sh, with rpm's rpmspec).
 # Missing Debian packages are installed with apt-get (as root) only when missing.
 set -euo pipefail
 cd "$(dirname "$0")/.."
@@ -110,9 +111,10 @@ case "${1:-}" in
     exec build/tools/korrin-sim/korrin-sim demo
     ;;
   test)
-    install_missing_packages "${fuzz_packages[@]}"
+    install_missing_packages "${fuzz_packages[@]}" rpm
     build build
     run_tests build
+    bash packaging/check-spec.sh
     build_fuzzer
     run_tests build-fuzz
     ;;
