@@ -7,6 +7,7 @@
 #include <utility>
 
 #include <boost/make_shared.hpp>
+#include <boost/smart_ptr/make_shared_array.hpp>
 
 #include "common/log.h"
 #include "launcher-data-manager/store-internal.h"
@@ -19,6 +20,29 @@ using korrin::kPrepareLegacy;
 using korrin::kPrepareV2;
 
 namespace {
+
+// The download view's records, made a block at a time: one allocation serves
+// many rows, and each record handed out keeps its block alive. Blocks double
+// from 8 to 256 records, so that a short list makes few spare records and a
+// record kept alone holds at most 255 others.
+class BoxBlocks {
+ public:
+  BoxBlocks() : m_next(0), m_size(0) {}
+
+  BoxPtr Next() {
+    if (m_next == m_size) {
+      m_size = m_size == 0 ? 8 : (m_size < 256 ? m_size * 2 : 256);
+      m_block = boost::make_shared<GameBoxData[]>(m_size);
+      m_next = 0;
+    }
+    return BoxPtr(m_block, &m_block[m_next++]);
+  }
+
+ private:
+  boost::shared_ptr<GameBoxData[]> m_block;
+  size_t m_next;
+  size_t m_size;
+};
 
 // The k-th virtual page of a parent, remembered for the edits.
 PagePtr VirtualPage(int pageId, int parentId, bool isFolder, int k) {
@@ -44,8 +68,9 @@ std::vector<BoxPtr> LauncherDataManager::GetBoxDataListByDownload(int parentId, 
       << "WHERE b.isFolder = 0 AND b.IsPreload = 0 AND b.boxType != " << kShortcutBoxType << " ";
   Statement stmt(m_db, sql.str(), kPrepareLegacy);
   GridCursor cursor(korrin::MenuGrid(*this), GridCursor::kNewPage);
+  BoxBlocks records;
   while (stmt.Step()) {
-    BoxPtr box = boost::make_shared<GameBoxData>();
+    BoxPtr box = records.Next();
     box->boxId = stmt.Int(0);
     box->isFolder = stmt.Bool(1);
     box->appId = stmt.Text(2);
