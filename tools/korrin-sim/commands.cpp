@@ -239,8 +239,7 @@ void RunEvent(Session&, const Args& args) {
 }
 
 void RunBootDone(Session&, const Args&) {
-  int handlers = Dev().SendBusSignal("/Org/Tizen/System/DeviceD/Core",
-                                     "org.tizen.system.deviced.core", "BootingDone");
+  int handlers = Dev().SendBootDone();
   Out() << "BootingDone reached " << handlers << (handlers == 1 ? " handler\n" : " handlers\n");
 }
 
@@ -253,8 +252,7 @@ void RunPreference(Session&, const Args& args) {
 }
 
 void RunCard(Session&, const Args& args) {
-  int status = ParseNamed(args.Text("in|out"), {"out", "in"}, "in|out");
-  Dev().SetPreference("memory/sysman/mmc", status);
+  Dev().SetStorageCard(ParseNamed(args.Text("in|out"), {"out", "in"}, "in|out") != 0);
 }
 
 void RunScreen(Session&, const Args& args) {
