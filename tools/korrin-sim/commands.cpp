@@ -300,15 +300,7 @@ void RunStart(Session&, const Args&) { data_engin_initialization(); }
 
 void RunStop(Session&, const Args&) { data_engin_uninitialization(); }
 
-void RunCall(Session&, const Args& args) {
-  if (args.words().empty()) throw UsageError("call what? `help call` lists the operations");
-  if (args.words()[0] == "--list") {
-    if (args.words().size() > 1) throw UsageError("--list takes nothing more");
-    ListCalls(Out());
-  } else {
-    Call(args.words(), Out());
-  }
-}
+void RunCall(Session&, const Args& args) { Call(args.words(), Out()); }
 
 void RunOnCard(Session&, const Args& args) {
   std::vector<std::string> appIds = args.List("APPID");
