@@ -376,26 +376,10 @@ LauncherDataManager& StartedStore() {
   return korrin::DataManager();
 }
 
-// Computed pages and the boxes on them, drawn page by page.
-void PrintComputedView(const std::vector<boost::shared_ptr<GamePageData> >& pages,
-                       const std::vector<boost::shared_ptr<GameBoxData> >& boxes, int columns) {
-  if (pages.empty()) Out() << " (no pages)\n";
-  for (const boost::shared_ptr<GamePageData>& page : pages) {
-    Out() << "page " << page->pageNo << " (pageId " << page->pageId << ")\n";
-    std::vector<GridBox> grid;
-    for (const boost::shared_ptr<GameBoxData>& box : boxes) {
-      if (box->pageId != page->pageId) continue;
-      grid.push_back(GridBox{box->col, box->row,
-                             BoxLabel(box->isFolder, box->boxType, box->appId, box->name)});
-    }
-    PrintGrid(grid, columns, 0, Out());
-  }
-}
-
 void RunDownloads(Session&, const Args&) {
   LauncherDataManager& store = StartedStore();
   PrintComputedView(store.GetPageDataListByDownload(1, false),
-                    store.GetBoxDataListByDownload(1, false), 4);
+                    store.GetBoxDataListByDownload(1, false), 4, Out());
 }
 
 void RunAlphabetical(Session&, const Args& args) {
@@ -403,48 +387,19 @@ void RunAlphabetical(Session&, const Args& args) {
   bool folder = args.Get<bool>("folder");
   LauncherDataManager& store = StartedStore();
   PrintComputedView(store.GetPageDataListByAlphabeticalOrder(parentId, folder),
-                    store.GetBoxDataListByAlphabeticalOrder(parentId, folder), folder ? 3 : 4);
-}
-
-// dlog priorities by letter, lowest first, from DLOG_VERBOSE (2).
-const std::string kPriorities = "VDIWEF";
-
-char PriorityLetter(int priority) {
-  int index = priority - 2;
-  return index >= 0 && index < static_cast<int>(kPriorities.size()) ? kPriorities[index] : '?';
-}
-
-// The text after the engine's "file: function(line) >  " prefix.
-std::string Message(const std::string& text) {
-  size_t end = text.find(") >  ");
-  return end == std::string::npos ? text : text.substr(end + 5);
-}
-
-// A log text on one line: a newline in it shows as \n, as it was written.
-std::string OneLine(const std::string& text) {
-  std::string line;
-  for (char c : text) line += c == '\n' ? std::string("\\n") : std::string(1, c);
-  return line;
+                    store.GetBoxDataListByAlphabeticalOrder(parentId, folder), folder ? 3 : 4,
+                    Out());
 }
 
 void RunLog(Session& session, const Args& args) {
-  int lowest = 0;
-  if (args.Has("priority")) {
-    std::string letter = args.Text("priority");
-    size_t index = kPriorities.find(letter);
-    if (letter.size() != 1 || index == std::string::npos) {
-      throw UsageError("--priority: '" + letter + "' is not one of V D I W E F");
-    }
-    lowest = static_cast<int>(index) + 2;
-  }
+  int lowest = args.Has("priority") ? ParsePriority(args.Text("priority")) : 0;
   const std::vector<sim::LogLine>& lines = Dev().Logs();
   size_t first = args.Get<bool>("all") ? 0 : std::min(session.logMark(), lines.size());
   for (size_t i = first; i < lines.size(); ++i) {
     const sim::LogLine& line = lines[i];
     if (line.priority < lowest) continue;
     if (args.Has("grep") && line.text.find(args.Text("grep")) == std::string::npos) continue;
-    std::string text = args.Get<bool>("message") ? Message(line.text) : line.text;
-    Out() << PriorityLetter(line.priority) << "/" << line.tag << ": " << OneLine(text) << "\n";
+    PrintLogLine(line, args.Get<bool>("message"), Out());
   }
 }
 
