@@ -601,18 +601,42 @@ std::vector<Command> MakeCommands() {
        "Shows the rows the last command that changed something added (+), removed (-)\n"
        "and changed (~, column by column).",
        "uninstall com.acme.tetra\nchanges", kView, kParsed, NoOptions, RunChanges},
-      {"expect", "", "check what the previous command printed",
-       "The lines that follow, up to a blank line or `end`, must equal what the\n"
-       "previous command printed. Runs of blanks count as one; trailing blanks do not\n"
-       "count. A difference stops the script with a diff.",
-       "layout\nexpect\nmenu 1 \"Apps\"\npage 1\n 1 | Tetra Blocks\nend", kView, kParsed,
-       NoOptions, [](Session&, const Args&) {}},
       {"say", "TEXT...", "print a sentence", "Prints its words: narration for stories.",
        "say Now the card comes out.", kView, kText, NoOptions, RunSay},
       {"help", "[COMMAND]", "list the commands, or describe one",
        "Lists the commands, or describes COMMAND with its options and an example.",
        "help install", kView, kParsed, NoOptions, RunHelp},
   };
+}
+
+// Script lines that are not commands (the session reads them itself), for
+// `help` to describe as it does commands.
+const std::vector<Command>& Topics() {
+  static const std::vector<Command> topics = {
+      {"expect", "", "check what the previous command printed",
+       "The lines that follow, up to a blank line or `end`, must equal what the\n"
+       "previous command printed. Runs of blanks count as one; trailing blanks do not\n"
+       "count. A difference stops the script with a diff.",
+       "layout\nexpect\nmenu 1 \"Apps\"\npage 1\n 1 | Tetra Blocks\nend", false,
+       Command::kOptions, NoOptions, nullptr},
+  };
+  return topics;
+}
+
+const Command* Named(const std::vector<Command>& commands, const std::string& name) {
+  for (const Command& command : commands) {
+    if (command.name == name) return &command;
+  }
+  return NULL;
+}
+
+// One line of the command list: the synopsis, then the summary at column 32.
+void PrintSummary(const Command& command, std::ostream& out) {
+  std::string synopsis = command.name + (command.args.empty() ? "" : " " + command.args);
+  // A long synopsis gets a line of its own, so that no line passes 80 columns.
+  if (synopsis.size() >= 30) synopsis += "\n" + std::string(32, ' ');
+  out << "  " << synopsis << std::string(synopsis.size() < 30 ? 30 - synopsis.size() : 0, ' ')
+      << command.summary << "\n";
 }
 
 }  // namespace
@@ -633,11 +657,56 @@ const std::vector<Command>& Commands() {
   return commands;
 }
 
-const Command* FindCommand(const std::string& name) {
-  for (const Command& command : Commands()) {
-    if (command.name == name) return &command;
+const Command* FindCommand(const std::string& name) { return Named(Commands(), name); }
+
+po::options_description VisibleOptions(const Command& command) {
+  po::options_description options("options", 80, 40);
+  command.options(options);
+  return options;
+}
+
+void PrintCommandList(std::ostream& out) {
+  out << "usage: korrin-sim [demo] [--root DIR]\n"
+         "       korrin-sim run [--root DIR] FILE...\n"
+         "       korrin-sim shell [--root DIR]\n"
+         "       korrin-sim help [COMMAND]\n\n"
+         "Without --root, the device lives in a fresh temporary folder.\n"
+         "Scripts hold one command per line; # starts a comment line.\n\n"
+         "commands:\n";
+  for (const Command& command : Commands()) PrintSummary(command, out);
+  for (const Command& topic : Topics()) PrintSummary(topic, out);
+  out << "\n`korrin-sim help COMMAND` describes one, with its options.\n\n"
+         "a first script: the launcher starts on an empty phone, two games are\n"
+         "installed and one uninstalled, and the layout is checked:\n"
+         "  start\n"
+         "  install com.acme.tetra \"Tetra Blocks\"\n"
+         "  install com.acme.zeppelin \"Zeppelin\"\n"
+         "  uninstall com.acme.tetra\n"
+         "  layout\n"
+         "  expect\n"
+         "  menu 1 \"Apps\"\n"
+         "  page 1\n"
+         "   1 | Zeppelin\n"
+         "  end\n";
+}
+
+void PrintCommandHelp(const std::string& name, std::ostream& out) {
+  const Command* command = FindCommand(name);
+  if (command == NULL) command = Named(Topics(), name);
+  if (command == NULL) throw UsageError("no command '" + name + "' (`help` lists them)");
+  out << "usage: " << command->name << (command->args.empty() ? "" : " " + command->args)
+      << "\n\n"
+      << command->details << "\n";
+  po::options_description options = VisibleOptions(*command);
+  if (!options.options().empty()) out << "\n" << options;
+  if (command->name == "call") {
+    out << "\noperations:\n";
+    ListCalls(out);
   }
-  return NULL;
+  out << "\nexample:\n";
+  std::istringstream example(command->example);
+  std::string line;
+  while (std::getline(example, line)) out << "  " << line << "\n";
 }
 
 }  // namespace korrin_sim

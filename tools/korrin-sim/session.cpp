@@ -10,7 +10,6 @@
 #include <boost/program_options.hpp>
 #include <dtl/dtl.hpp>
 
-#include "calls.h"
 #include "cli.h"
 #include "commands.h"
 #include "common/device-path.h"
@@ -65,12 +64,6 @@ void RefuseSpacedFlagValue(const Command& command, const po::options_description
     throw UsageError(command.name + ": write " + word + "=" + words[i + 1] + ", not " + word +
                      " " + words[i + 1]);
   }
-}
-
-po::options_description VisibleOptions(const Command& command) {
-  po::options_description options("options", 80, 40);
-  command.options(options);
-  return options;
 }
 
 // Parses |words| as |command|'s arguments into |values|; throws UsageError.
@@ -309,54 +302,6 @@ bool Session::RunScript(std::istream& in, const std::string& file, std::ostream&
     }
   }
   return true;
-}
-
-void PrintCommandList(std::ostream& out) {
-  out << "usage: korrin-sim [demo] [--root DIR]\n"
-         "       korrin-sim run [--root DIR] FILE...\n"
-         "       korrin-sim shell [--root DIR]\n"
-         "       korrin-sim help [COMMAND]\n\n"
-         "Without --root, the device lives in a fresh temporary folder.\n"
-         "Scripts hold one command per line; # starts a comment line.\n\n"
-         "commands:\n";
-  for (const Command& command : Commands()) {
-    std::string synopsis = command.name + (command.args.empty() ? "" : " " + command.args);
-    // A long synopsis gets a line of its own, so that no line passes 80 columns.
-    if (synopsis.size() >= 30) synopsis += "\n" + std::string(32, ' ');
-    out << "  " << synopsis << std::string(synopsis.size() < 30 ? 30 - synopsis.size() : 0, ' ')
-        << command.summary << "\n";
-  }
-  out << "\n`korrin-sim help COMMAND` describes one, with its options.\n\n"
-         "a first script: the launcher starts on an empty phone, two games are\n"
-         "installed and one uninstalled, and the layout is checked:\n"
-         "  start\n"
-         "  install com.acme.tetra \"Tetra Blocks\"\n"
-         "  install com.acme.zeppelin \"Zeppelin\"\n"
-         "  uninstall com.acme.tetra\n"
-         "  layout\n"
-         "  expect\n"
-         "  menu 1 \"Apps\"\n"
-         "  page 1\n"
-         "   1 | Zeppelin\n"
-         "  end\n";
-}
-
-void PrintCommandHelp(const std::string& name, std::ostream& out) {
-  const Command* command = FindCommand(name);
-  if (command == NULL) throw UsageError("no command '" + name + "' (`help` lists them)");
-  out << "usage: " << command->name << (command->args.empty() ? "" : " " + command->args)
-      << "\n\n"
-      << command->details << "\n";
-  po::options_description options = VisibleOptions(*command);
-  if (!options.options().empty()) out << "\n" << options;
-  if (command->name == "call") {
-    out << "\noperations:\n";
-    ListCalls(out);
-  }
-  out << "\nexample:\n";
-  std::istringstream example(command->example);
-  std::string line;
-  while (std::getline(example, line)) out << "  " << line << "\n";
 }
 
 }  // namespace korrin_sim

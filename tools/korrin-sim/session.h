@@ -96,11 +96,6 @@ class Session {
   std::map<std::string, std::deque<std::string> > beforeCalls_;  // lines waiting, by call
 };
 
-// `korrin-sim --help`: every command, one line each, and a first script.
-void PrintCommandList(std::ostream& out);
-// `help COMMAND`: what it does, its options and an example.
-void PrintCommandHelp(const std::string& name, std::ostream& out);
-
 }  // namespace korrin_sim
 
 #endif  // KORRIN_SIM_SESSION_H_
