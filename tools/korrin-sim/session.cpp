@@ -143,6 +143,12 @@ std::string RestOfLine(const std::string& line) {
 
 bool IsBlank(const std::string& line) { return Normalized(line).empty(); }
 
+// Whether |line| holds |word| alone, blanks around it allowed.
+bool IsOnly(const std::string& line, const std::string& word) {
+  size_t first = line.find_first_not_of(" \t");
+  return first != std::string::npos && Normalized(line.substr(first)) == word;
+}
+
 bool IsComment(const std::string& line) {
   size_t first = line.find_first_not_of(" \t");
   return first != std::string::npos && line[first] == '#';
@@ -277,29 +283,42 @@ void Session::Expect(const std::vector<std::string>& expectedLines) const {
   throw UsageError(message.str());
 }
 
+Session::Fed Session::Feed(const std::string& line) {
+  if (!block_) {
+    if (!IsOnly(line, "expect")) {
+      Execute(line);
+      return Fed::kRan;
+    }
+    block_.emplace();
+    return Fed::kCollected;
+  }
+  if (!IsBlank(line) && !IsOnly(line, "end")) {
+    block_->push_back(line);
+    return Fed::kCollected;
+  }
+  std::vector<std::string> block = std::move(*block_);
+  block_.reset();
+  Expect(block);
+  return Fed::kChecked;
+}
+
+Session::Fed Session::Finish() { return block_ ? Feed("") : Fed::kRan; }
+
 bool Session::RunScript(std::istream& in, const std::string& file, std::ostream& errors) {
   std::string line;
   int number = 0;
-  while (std::getline(in, line)) {
-    ++number;
-    int at = number;
-    try {
-      if (Normalized(line) == "expect") {
-        std::vector<std::string> block;
-        while (std::getline(in, line)) {
-          ++number;
-          if (IsBlank(line) || Normalized(line) == "end") break;
-          block.push_back(line);
-        }
-        Expect(block);
-      } else {
-        Execute(line);
-      }
-    } catch (const std::exception& e) {
-      std::cout << std::flush;
-      errors << file << ":" << at << ": " << e.what() << std::endl;
-      return false;
+  int at = 0;  // where an error is told: its line, or the `expect` of its block
+  try {
+    while (std::getline(in, line)) {
+      ++number;
+      if (!block_) at = number;
+      Feed(line);
     }
+    Finish();
+  } catch (const std::exception& e) {
+    std::cout << std::flush;
+    errors << file << ":" << at << ": " << e.what() << std::endl;
+    return false;
   }
   return true;
 }
