@@ -214,7 +214,7 @@ void BuildMenu(Scene& scene) {
       std::to_string(UninstalledPage()) + ";"
       "COMMIT;");
   AddGames(g_menuBoxes);
-  Dev().SetPreference("memory/sysman/mmc", 1);
+  Dev().SetStorageCard(true);
   Dev().ClearLogs();
 }
 
@@ -275,11 +275,7 @@ std::vector<Event> Events() {
          Dev().AddGame(GameId(Uninstalled()), GameLabel(Uninstalled()));
          Forget(GameId(Uninstalled()));
        }},
-      {"engine:BootDone(100 on card)",
-       [] {
-         Dev().SendBusSignal("/Org/Tizen/System/DeviceD/Core", "org.tizen.system.deviced.core",
-                             "BootingDone");
-       },
+      {"engine:BootDone(100 on card)", [] { Dev().SendBootDone(); },
        [](const Scene&) { Dev().ClearLogs(); }, FlagCardApps},
   };
 }

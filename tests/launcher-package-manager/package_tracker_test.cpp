@@ -44,8 +44,8 @@ TEST_F(PackageTrackerTest, BootDoneSetsTheCardFlagFromItsStatus) {
   // stored, status, read fails, inserted
   const int cases[][4] = {{1, 1, 0, 1}, {1, -3, 0, 1}, {1, 0, 0, 0}, {0, 1, 0, 0}, {1, 1, 1, 0}};
   for (const auto& c : cases) {
-    device.RemovePreference("memory/sysman/mmc");
-    if (c[0]) device.SetPreference("memory/sysman/mmc", c[1]);
+    device.ClearStorageCard();
+    if (c[0]) device.SetStorageCardStatus(c[1]);
     if (c[2]) device.FailNext("preference_get_int", PREFERENCE_ERROR_IO_ERROR);
     manager.m_isMmcInserted = !c[3];
     LauncherPackageManager::_BootingDoneSignalCb(&manager, NULL);

@@ -703,8 +703,11 @@ std::string FormatPage(const GamePageData& page) { return Format(kPage, page); }
 std::string FormatBox(const GameBoxData& box) { return Format(kBox, box); }
 
 void Call(const std::vector<std::string>& words, std::ostream& out) {
-  if (words.empty()) throw UsageError("missing NAME (call --list shows them)");
-  if (words[0] == "--list" && words.size() == 1) return ListCalls(out);
+  if (words.empty()) throw UsageError("call what? `help call` lists the operations");
+  if (words[0] == "--list") {
+    if (words.size() > 1) throw UsageError("--list takes nothing more");
+    return ListCalls(out);
+  }
   if (words[0] == "--help" && words.size() == 2) return HelpCall(words[1], out);
   std::vector<const Operation*> found = Find(words[0]);
   if (found.front()->cls != found.back()->cls) {

@@ -239,8 +239,7 @@ void RunEvent(Session&, const Args& args) {
 }
 
 void RunBootDone(Session&, const Args&) {
-  int handlers = Dev().SendBusSignal("/Org/Tizen/System/DeviceD/Core",
-                                     "org.tizen.system.deviced.core", "BootingDone");
+  int handlers = Dev().SendBootDone();
   Out() << "BootingDone reached " << handlers << (handlers == 1 ? " handler\n" : " handlers\n");
 }
 
@@ -253,8 +252,7 @@ void RunPreference(Session&, const Args& args) {
 }
 
 void RunCard(Session&, const Args& args) {
-  int status = ParseNamed(args.Text("in|out"), {"out", "in"}, "in|out");
-  Dev().SetPreference("memory/sysman/mmc", status);
+  Dev().SetStorageCard(ParseNamed(args.Text("in|out"), {"out", "in"}, "in|out") != 0);
 }
 
 void RunScreen(Session&, const Args& args) {
@@ -302,15 +300,7 @@ void RunStart(Session&, const Args&) { data_engin_initialization(); }
 
 void RunStop(Session&, const Args&) { data_engin_uninitialization(); }
 
-void RunCall(Session&, const Args& args) {
-  if (args.words().empty()) throw UsageError("call what? `help call` lists the operations");
-  if (args.words()[0] == "--list") {
-    if (args.words().size() > 1) throw UsageError("--list takes nothing more");
-    ListCalls(Out());
-  } else {
-    Call(args.words(), Out());
-  }
-}
+void RunCall(Session&, const Args& args) { Call(args.words(), Out()); }
 
 void RunOnCard(Session&, const Args& args) {
   std::vector<std::string> appIds = args.List("APPID");
@@ -386,26 +376,10 @@ LauncherDataManager& StartedStore() {
   return korrin::DataManager();
 }
 
-// Computed pages and the boxes on them, drawn page by page.
-void PrintComputedView(const std::vector<boost::shared_ptr<GamePageData> >& pages,
-                       const std::vector<boost::shared_ptr<GameBoxData> >& boxes, int columns) {
-  if (pages.empty()) Out() << " (no pages)\n";
-  for (const boost::shared_ptr<GamePageData>& page : pages) {
-    Out() << "page " << page->pageNo << " (pageId " << page->pageId << ")\n";
-    std::vector<GridBox> grid;
-    for (const boost::shared_ptr<GameBoxData>& box : boxes) {
-      if (box->pageId != page->pageId) continue;
-      grid.push_back(GridBox{box->col, box->row,
-                             BoxLabel(box->isFolder, box->boxType, box->appId, box->name)});
-    }
-    PrintGrid(grid, columns, 0, Out());
-  }
-}
-
 void RunDownloads(Session&, const Args&) {
   LauncherDataManager& store = StartedStore();
   PrintComputedView(store.GetPageDataListByDownload(1, false),
-                    store.GetBoxDataListByDownload(1, false), 4);
+                    store.GetBoxDataListByDownload(1, false), 4, Out());
 }
 
 void RunAlphabetical(Session&, const Args& args) {
@@ -413,48 +387,19 @@ void RunAlphabetical(Session&, const Args& args) {
   bool folder = args.Get<bool>("folder");
   LauncherDataManager& store = StartedStore();
   PrintComputedView(store.GetPageDataListByAlphabeticalOrder(parentId, folder),
-                    store.GetBoxDataListByAlphabeticalOrder(parentId, folder), folder ? 3 : 4);
-}
-
-// dlog priorities by letter, lowest first, from DLOG_VERBOSE (2).
-const std::string kPriorities = "VDIWEF";
-
-char PriorityLetter(int priority) {
-  int index = priority - 2;
-  return index >= 0 && index < static_cast<int>(kPriorities.size()) ? kPriorities[index] : '?';
-}
-
-// The text after the engine's "file: function(line) >  " prefix.
-std::string Message(const std::string& text) {
-  size_t end = text.find(") >  ");
-  return end == std::string::npos ? text : text.substr(end + 5);
-}
-
-// A log text on one line: a newline in it shows as \n, as it was written.
-std::string OneLine(const std::string& text) {
-  std::string line;
-  for (char c : text) line += c == '\n' ? std::string("\\n") : std::string(1, c);
-  return line;
+                    store.GetBoxDataListByAlphabeticalOrder(parentId, folder), folder ? 3 : 4,
+                    Out());
 }
 
 void RunLog(Session& session, const Args& args) {
-  int lowest = 0;
-  if (args.Has("priority")) {
-    std::string letter = args.Text("priority");
-    size_t index = kPriorities.find(letter);
-    if (letter.size() != 1 || index == std::string::npos) {
-      throw UsageError("--priority: '" + letter + "' is not one of V D I W E F");
-    }
-    lowest = static_cast<int>(index) + 2;
-  }
+  int lowest = args.Has("priority") ? ParsePriority(args.Text("priority")) : 0;
   const std::vector<sim::LogLine>& lines = Dev().Logs();
   size_t first = args.Get<bool>("all") ? 0 : std::min(session.logMark(), lines.size());
   for (size_t i = first; i < lines.size(); ++i) {
     const sim::LogLine& line = lines[i];
     if (line.priority < lowest) continue;
     if (args.Has("grep") && line.text.find(args.Text("grep")) == std::string::npos) continue;
-    std::string text = args.Get<bool>("message") ? Message(line.text) : line.text;
-    Out() << PriorityLetter(line.priority) << "/" << line.tag << ": " << OneLine(text) << "\n";
+    PrintLogLine(line, args.Get<bool>("message"), Out());
   }
 }
 
@@ -656,18 +601,42 @@ std::vector<Command> MakeCommands() {
        "Shows the rows the last command that changed something added (+), removed (-)\n"
        "and changed (~, column by column).",
        "uninstall com.acme.tetra\nchanges", kView, kParsed, NoOptions, RunChanges},
-      {"expect", "", "check what the previous command printed",
-       "The lines that follow, up to a blank line or `end`, must equal what the\n"
-       "previous command printed. Runs of blanks count as one; trailing blanks do not\n"
-       "count. A difference stops the script with a diff.",
-       "layout\nexpect\nmenu 1 \"Apps\"\npage 1\n 1 | Tetra Blocks\nend", kView, kParsed,
-       NoOptions, [](Session&, const Args&) {}},
       {"say", "TEXT...", "print a sentence", "Prints its words: narration for stories.",
        "say Now the card comes out.", kView, kText, NoOptions, RunSay},
       {"help", "[COMMAND]", "list the commands, or describe one",
        "Lists the commands, or describes COMMAND with its options and an example.",
        "help install", kView, kParsed, NoOptions, RunHelp},
   };
+}
+
+// Script lines that are not commands (the session reads them itself), for
+// `help` to describe as it does commands.
+const std::vector<Command>& Topics() {
+  static const std::vector<Command> topics = {
+      {"expect", "", "check what the previous command printed",
+       "The lines that follow, up to a blank line or `end`, must equal what the\n"
+       "previous command printed. Runs of blanks count as one; trailing blanks do not\n"
+       "count. A difference stops the script with a diff.",
+       "layout\nexpect\nmenu 1 \"Apps\"\npage 1\n 1 | Tetra Blocks\nend", false,
+       Command::kOptions, NoOptions, nullptr},
+  };
+  return topics;
+}
+
+const Command* Named(const std::vector<Command>& commands, const std::string& name) {
+  for (const Command& command : commands) {
+    if (command.name == name) return &command;
+  }
+  return NULL;
+}
+
+// One line of the command list: the synopsis, then the summary at column 32.
+void PrintSummary(const Command& command, std::ostream& out) {
+  std::string synopsis = command.name + (command.args.empty() ? "" : " " + command.args);
+  // A long synopsis gets a line of its own, so that no line passes 80 columns.
+  if (synopsis.size() >= 30) synopsis += "\n" + std::string(32, ' ');
+  out << "  " << synopsis << std::string(synopsis.size() < 30 ? 30 - synopsis.size() : 0, ' ')
+      << command.summary << "\n";
 }
 
 }  // namespace
@@ -688,11 +657,56 @@ const std::vector<Command>& Commands() {
   return commands;
 }
 
-const Command* FindCommand(const std::string& name) {
-  for (const Command& command : Commands()) {
-    if (command.name == name) return &command;
+const Command* FindCommand(const std::string& name) { return Named(Commands(), name); }
+
+po::options_description VisibleOptions(const Command& command) {
+  po::options_description options("options", 80, 40);
+  command.options(options);
+  return options;
+}
+
+void PrintCommandList(std::ostream& out) {
+  out << "usage: korrin-sim [demo] [--root DIR]\n"
+         "       korrin-sim run [--root DIR] FILE...\n"
+         "       korrin-sim shell [--root DIR]\n"
+         "       korrin-sim help [COMMAND]\n\n"
+         "Without --root, the device lives in a fresh temporary folder.\n"
+         "Scripts hold one command per line; # starts a comment line.\n\n"
+         "commands:\n";
+  for (const Command& command : Commands()) PrintSummary(command, out);
+  for (const Command& topic : Topics()) PrintSummary(topic, out);
+  out << "\n`korrin-sim help COMMAND` describes one, with its options.\n\n"
+         "a first script: the launcher starts on an empty phone, two games are\n"
+         "installed and one uninstalled, and the layout is checked:\n"
+         "  start\n"
+         "  install com.acme.tetra \"Tetra Blocks\"\n"
+         "  install com.acme.zeppelin \"Zeppelin\"\n"
+         "  uninstall com.acme.tetra\n"
+         "  layout\n"
+         "  expect\n"
+         "  menu 1 \"Apps\"\n"
+         "  page 1\n"
+         "   1 | Zeppelin\n"
+         "  end\n";
+}
+
+void PrintCommandHelp(const std::string& name, std::ostream& out) {
+  const Command* command = FindCommand(name);
+  if (command == NULL) command = Named(Topics(), name);
+  if (command == NULL) throw UsageError("no command '" + name + "' (`help` lists them)");
+  out << "usage: " << command->name << (command->args.empty() ? "" : " " + command->args)
+      << "\n\n"
+      << command->details << "\n";
+  po::options_description options = VisibleOptions(*command);
+  if (!options.options().empty()) out << "\n" << options;
+  if (command->name == "call") {
+    out << "\noperations:\n";
+    ListCalls(out);
   }
-  return NULL;
+  out << "\nexample:\n";
+  std::istringstream example(command->example);
+  std::string line;
+  while (std::getline(example, line)) out << "  " << line << "\n";
 }
 
 }  // namespace korrin_sim

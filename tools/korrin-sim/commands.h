@@ -1,11 +1,12 @@
 // The commands of korrin-sim, as one table: what each takes, what it does,
-// and an example. Options and positional arguments are parsed by
-// Boost.Program_options before a command runs, so a command that does not
-// parse never starts.
+// and an example, which `help` prints. Options and positional arguments are
+// parsed by Boost.Program_options before a command runs, so a command that
+// does not parse never starts.
 #ifndef KORRIN_SIM_COMMANDS_H_
 #define KORRIN_SIM_COMMANDS_H_
 
 #include <functional>
+#include <ostream>
 #include <string>
 #include <vector>
 
@@ -57,6 +58,15 @@ struct Command {
 const std::vector<Command>& Commands();
 // The command, or null.
 const Command* FindCommand(const std::string& name);
+// The options |command| shows in its help and parses.
+boost::program_options::options_description VisibleOptions(const Command& command);
+
+// `korrin-sim --help`: every command, one line each, and a first script.
+void PrintCommandList(std::ostream& out);
+// `help COMMAND`: what it does, its options and an example; also for
+// `expect`, which is read by the session rather than run. Throws UsageError
+// for a name that is neither.
+void PrintCommandHelp(const std::string& name, std::ostream& out);
 
 }  // namespace korrin_sim
 

@@ -97,22 +97,16 @@ int Shell(std::string root) {
   std::string history = std::string(home != NULL ? home : ".") + "/.korrin_sim_history";
   read_history(history.c_str());
   korrin_sim::Session session;
+  using Fed = korrin_sim::Session::Fed;
+  Fed fed = Fed::kRan;
   std::string line;
-  while (ReadLine("korrin> ", line)) {
+  for (bool more = true; more;) {
+    more = ReadLine(fed == Fed::kCollected ? "  ...> " : "korrin> ", line);
     try {
-      if (line.find_first_not_of(" \t") != std::string::npos &&
-          line.substr(line.find_first_not_of(" \t")) == "expect") {
-        std::vector<std::string> block;
-        while (ReadLine("  ...> ", line) && line.find_first_not_of(" \t") != std::string::npos &&
-               line != "end") {
-          block.push_back(line);
-        }
-        session.Expect(block);
-        std::cout << "as expected\n";
-      } else {
-        session.Execute(line);
-      }
+      fed = more ? session.Feed(line) : session.Finish();
+      if (fed == Fed::kChecked) std::cout << "as expected\n";
     } catch (const std::exception& e) {
+      fed = Fed::kRan;
       std::cout << std::flush;
       std::cerr << e.what() << std::endl;
     }

@@ -10,7 +10,6 @@
 #include <boost/program_options.hpp>
 #include <dtl/dtl.hpp>
 
-#include "calls.h"
 #include "cli.h"
 #include "commands.h"
 #include "common/device-path.h"
@@ -65,12 +64,6 @@ void RefuseSpacedFlagValue(const Command& command, const po::options_description
     throw UsageError(command.name + ": write " + word + "=" + words[i + 1] + ", not " + word +
                      " " + words[i + 1]);
   }
-}
-
-po::options_description VisibleOptions(const Command& command) {
-  po::options_description options("options", 80, 40);
-  command.options(options);
-  return options;
 }
 
 // Parses |words| as |command|'s arguments into |values|; throws UsageError.
@@ -149,6 +142,12 @@ std::string RestOfLine(const std::string& line) {
 }
 
 bool IsBlank(const std::string& line) { return Normalized(line).empty(); }
+
+// Whether |line| holds |word| alone, blanks around it allowed.
+bool IsOnly(const std::string& line, const std::string& word) {
+  size_t first = line.find_first_not_of(" \t");
+  return first != std::string::npos && Normalized(line.substr(first)) == word;
+}
 
 bool IsComment(const std::string& line) {
   size_t first = line.find_first_not_of(" \t");
@@ -284,79 +283,44 @@ void Session::Expect(const std::vector<std::string>& expectedLines) const {
   throw UsageError(message.str());
 }
 
+Session::Fed Session::Feed(const std::string& line) {
+  if (!block_) {
+    if (!IsOnly(line, "expect")) {
+      Execute(line);
+      return Fed::kRan;
+    }
+    block_.emplace();
+    return Fed::kCollected;
+  }
+  if (!IsBlank(line) && !IsOnly(line, "end")) {
+    block_->push_back(line);
+    return Fed::kCollected;
+  }
+  std::vector<std::string> block = std::move(*block_);
+  block_.reset();
+  Expect(block);
+  return Fed::kChecked;
+}
+
+Session::Fed Session::Finish() { return block_ ? Feed("") : Fed::kRan; }
+
 bool Session::RunScript(std::istream& in, const std::string& file, std::ostream& errors) {
   std::string line;
   int number = 0;
-  while (std::getline(in, line)) {
-    ++number;
-    int at = number;
-    try {
-      if (Normalized(line) == "expect") {
-        std::vector<std::string> block;
-        while (std::getline(in, line)) {
-          ++number;
-          if (IsBlank(line) || Normalized(line) == "end") break;
-          block.push_back(line);
-        }
-        Expect(block);
-      } else {
-        Execute(line);
-      }
-    } catch (const std::exception& e) {
-      std::cout << std::flush;
-      errors << file << ":" << at << ": " << e.what() << std::endl;
-      return false;
+  int at = 0;  // where an error is told: its line, or the `expect` of its block
+  try {
+    while (std::getline(in, line)) {
+      ++number;
+      if (!block_) at = number;
+      Feed(line);
     }
+    Finish();
+  } catch (const std::exception& e) {
+    std::cout << std::flush;
+    errors << file << ":" << at << ": " << e.what() << std::endl;
+    return false;
   }
   return true;
-}
-
-void PrintCommandList(std::ostream& out) {
-  out << "usage: korrin-sim [demo] [--root DIR]\n"
-         "       korrin-sim run [--root DIR] FILE...\n"
-         "       korrin-sim shell [--root DIR]\n"
-         "       korrin-sim help [COMMAND]\n\n"
-         "Without --root, the device lives in a fresh temporary folder.\n"
-         "Scripts hold one command per line; # starts a comment line.\n\n"
-         "commands:\n";
-  for (const Command& command : Commands()) {
-    std::string synopsis = command.name + (command.args.empty() ? "" : " " + command.args);
-    // A long synopsis gets a line of its own, so that no line passes 80 columns.
-    if (synopsis.size() >= 30) synopsis += "\n" + std::string(32, ' ');
-    out << "  " << synopsis << std::string(synopsis.size() < 30 ? 30 - synopsis.size() : 0, ' ')
-        << command.summary << "\n";
-  }
-  out << "\n`korrin-sim help COMMAND` describes one, with its options.\n\n"
-         "a first script: the launcher starts on an empty phone, two games are\n"
-         "installed and one uninstalled, and the layout is checked:\n"
-         "  start\n"
-         "  install com.acme.tetra \"Tetra Blocks\"\n"
-         "  install com.acme.zeppelin \"Zeppelin\"\n"
-         "  uninstall com.acme.tetra\n"
-         "  layout\n"
-         "  expect\n"
-         "  menu 1 \"Apps\"\n"
-         "  page 1\n"
-         "   1 | Zeppelin\n"
-         "  end\n";
-}
-
-void PrintCommandHelp(const std::string& name, std::ostream& out) {
-  const Command* command = FindCommand(name);
-  if (command == NULL) throw UsageError("no command '" + name + "' (`help` lists them)");
-  out << "usage: " << command->name << (command->args.empty() ? "" : " " + command->args)
-      << "\n\n"
-      << command->details << "\n";
-  po::options_description options = VisibleOptions(*command);
-  if (!options.options().empty()) out << "\n" << options;
-  if (command->name == "call") {
-    out << "\noperations:\n";
-    ListCalls(out);
-  }
-  out << "\nexample:\n";
-  std::istringstream example(command->example);
-  std::string line;
-  while (std::getline(example, line)) out << "  " << line << "\n";
 }
 
 }  // namespace korrin_sim

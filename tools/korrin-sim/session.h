@@ -9,6 +9,7 @@
 #include <exception>
 #include <istream>
 #include <map>
+#include <optional>
 #include <ostream>
 #include <string>
 #include <vector>
@@ -40,12 +41,25 @@ class Session {
 
   // Checks that |line| (not blank) would run, changing nothing.
   void Check(const std::string& line) const { Prepare(line); }
-  // Compares the lines of an `expect` block with what the last command
-  // printed; throws UsageError with a diff when they differ.
-  void Expect(const std::vector<std::string>& lines) const;
+
+  // What Feed did with a line.
+  enum class Fed {
+    kRan,        // ran it as a command (a blank or comment line does nothing)
+    kCollected,  // opened an `expect` block, or added a line to the open one
+    kChecked,    // closed the block, which matched what was printed
+  };
+  // Takes the next line of a script or of the shell. `expect` alone on a
+  // line opens a block; a blank line or `end` (blanks around it allowed)
+  // closes it, and its lines are then compared with what the last command
+  // printed. Any other line runs as Execute runs it. Throws UsageError as
+  // Execute does, or with a diff when a block does not match.
+  Fed Feed(const std::string& line);
+  // The input has ended: an open block is closed and checked.
+  Fed Finish();
 
   // Plays a script to its end, or to its first error, which it reports as
-  // "FILE:LINE: message" on |errors|. True when every line ran.
+  // "FILE:LINE: message" on |errors| (a block's error at its `expect`). True
+  // when every line ran.
   bool RunScript(std::istream& in, const std::string& file, std::ostream& errors);
 
   // ---- For the commands.
@@ -72,6 +86,9 @@ class Session {
     boost::program_options::variables_map values;
   };
   Prepared Prepare(const std::string& line) const;
+  // Compares the lines of an `expect` block with what the last command
+  // printed; throws UsageError with a diff when they differ.
+  void Expect(const std::vector<std::string>& lines) const;
   // Has the first line waiting for |call| run when the engine next makes it.
   void ArmBefore(const std::string& call);
   // Points the trace at the store's connection of the moment: `start` opens
@@ -94,12 +111,9 @@ class Session {
   Snapshot after_;
   std::map<std::string, sim::Package> held_;
   std::map<std::string, std::deque<std::string> > beforeCalls_;  // lines waiting, by call
+  // The `expect` block being read, while one is open.
+  std::optional<std::vector<std::string> > block_;
 };
-
-// `korrin-sim --help`: every command, one line each, and a first script.
-void PrintCommandList(std::ostream& out);
-// `help COMMAND`: what it does, its options and an example.
-void PrintCommandHelp(const std::string& name, std::ostream& out);
 
 }  // namespace korrin_sim
 

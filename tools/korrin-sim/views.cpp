@@ -150,6 +150,27 @@ void PrintStoredPage(const Reader& db, int64_t pageId, int columns, int indent, 
 
 const char kNoDatabase[] = "no layout database yet: `start` makes it\n";
 
+// dlog priorities by letter, lowest first, from DLOG_VERBOSE (2).
+const std::string kPriorities = "VDIWEF";
+
+char PriorityLetter(int priority) {
+  int index = priority - 2;
+  return index >= 0 && index < static_cast<int>(kPriorities.size()) ? kPriorities[index] : '?';
+}
+
+// The text after the engine's "file: function(line) >  " prefix.
+std::string Message(const std::string& text) {
+  size_t end = text.find(") >  ");
+  return end == std::string::npos ? text : text.substr(end + 5);
+}
+
+// A log text on one line: a newline in it shows as \n, as it was written.
+std::string OneLine(const std::string& text) {
+  std::string line;
+  for (char c : text) line += c == '\n' ? std::string("\\n") : std::string(1, c);
+  return line;
+}
+
 }  // namespace
 
 std::string BoxLabel(bool isFolder, int boxType, const std::string& appId,
@@ -233,6 +254,22 @@ void PrintFolder(const std::string& dbPath, int boxId, bool ids, std::ostream& o
     return;
   }
   PrintFolderPages(db, boxId, box[0][0].text, 0, ids, out);
+}
+
+void PrintComputedView(const std::vector<boost::shared_ptr<GamePageData> >& pages,
+                       const std::vector<boost::shared_ptr<GameBoxData> >& boxes, int columns,
+                       std::ostream& out) {
+  if (pages.empty()) out << " (no pages)\n";
+  for (const boost::shared_ptr<GamePageData>& page : pages) {
+    out << "page " << page->pageNo << " (pageId " << page->pageId << ")\n";
+    std::vector<GridBox> grid;
+    for (const boost::shared_ptr<GameBoxData>& box : boxes) {
+      if (box->pageId != page->pageId) continue;
+      grid.push_back(GridBox{box->col, box->row,
+                             BoxLabel(box->isFolder, box->boxType, box->appId, box->name)});
+    }
+    PrintGrid(grid, columns, 0, out);
+  }
 }
 
 void PrintTables(const std::string& dbPath, const std::vector<std::string>& tables,
@@ -319,6 +356,19 @@ void PrintChanges(const Snapshot& before, const Snapshot& after, std::ostream& o
     }
   }
   if (!any) out << "no changes\n";
+}
+
+int ParsePriority(const std::string& letter) {
+  size_t index = kPriorities.find(letter);
+  if (letter.size() != 1 || index == std::string::npos) {
+    throw UsageError("--priority: '" + letter + "' is not one of V D I W E F");
+  }
+  return static_cast<int>(index) + 2;
+}
+
+void PrintLogLine(const sim::LogLine& line, bool messageOnly, std::ostream& out) {
+  std::string text = messageOnly ? Message(line.text) : line.text;
+  out << PriorityLetter(line.priority) << "/" << line.tag << ": " << OneLine(text) << "\n";
 }
 
 }  // namespace korrin_sim

@@ -1,7 +1,8 @@
 // The views of korrin-sim: the layout database drawn as the launcher shows it
 // (pages of 4-column grids, folders 3 by 3), its raw tables, and what a
-// command changed in it. They read the database file through a connection of
-// their own, so looking never changes the engine's state.
+// command changed in it; the views the engine computes, drawn the same way;
+// and the platform log. The stored views read the database file through a
+// connection of their own, so looking never changes the engine's state.
 #ifndef KORRIN_SIM_VIEWS_H_
 #define KORRIN_SIM_VIEWS_H_
 
@@ -11,6 +12,11 @@
 #include <ostream>
 #include <string>
 #include <vector>
+
+#include <boost/shared_ptr.hpp>
+
+#include "launcher-data-manager/game-data.h"
+#include "sim/device.h"
 
 namespace korrin_sim {
 
@@ -37,6 +43,12 @@ void PrintMenuLayout(const std::string& dbPath, int menuId, bool ids, std::ostre
 // The pages of the folder box |boxId|.
 void PrintFolder(const std::string& dbPath, int boxId, bool ids, std::ostream& out);
 
+// Pages the engine computed (the download and alphabetical views) and the
+// boxes on them, page by page as grids of |columns|.
+void PrintComputedView(const std::vector<boost::shared_ptr<GamePageData> >& pages,
+                       const std::vector<boost::shared_ptr<GameBoxData> >& boxes, int columns,
+                       std::ostream& out);
+
 // Every row of the named tables (all tables when |tables| is empty).
 void PrintTables(const std::string& dbPath, const std::vector<std::string>& tables,
                  std::ostream& out);
@@ -53,6 +65,14 @@ struct Snapshot {
 Snapshot TakeSnapshot(const std::string& dbPath);
 // Rows added (+), removed (-) and changed (~, column by column).
 void PrintChanges(const Snapshot& before, const Snapshot& after, std::ostream& out);
+
+// ---- The platform log.
+
+// dlog's priority for its letter (V D I W E F); throws UsageError for another.
+int ParsePriority(const std::string& letter);
+// |line| as "P/tag: text", a newline in the text as \n; |messageOnly| leaves
+// out the engine's "file: function(line) >  " prefix.
+void PrintLogLine(const sim::LogLine& line, bool messageOnly, std::ostream& out);
 
 }  // namespace korrin_sim
 

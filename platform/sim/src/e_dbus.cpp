@@ -53,6 +53,11 @@ int Device::SendBusSignal(const std::string& path, const std::string& interface,
   return called;
 }
 
+int Device::SendBootDone() {
+  return SendBusSignal("/Org/Tizen/System/DeviceD/Core", "org.tizen.system.deviced.core",
+                       "BootingDone");
+}
+
 int Device::BusInitCount() const { return TheState().held.busInitCount; }
 
 int Device::BusSubscriptions() const {

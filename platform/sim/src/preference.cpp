@@ -6,11 +6,24 @@
 
 namespace sim {
 
+namespace {
+
+// Where deviced keeps the storage-card status.
+const char kStorageCardKey[] = "memory/sysman/mmc";
+
+}  // namespace
+
 void Device::SetPreference(const std::string& key, int value) {
   TheState().preferences[key] = value;
 }
 
 void Device::RemovePreference(const std::string& key) { TheState().preferences.erase(key); }
+
+void Device::SetStorageCard(bool inserted) { SetStorageCardStatus(inserted ? 1 : 0); }
+
+void Device::SetStorageCardStatus(int status) { SetPreference(kStorageCardKey, status); }
+
+void Device::ClearStorageCard() { RemovePreference(kStorageCardKey); }
 
 }  // namespace sim
 

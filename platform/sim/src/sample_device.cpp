@@ -115,7 +115,7 @@ void Device::LoadSampleDevice() {
 
   SetSystemInfo("http://tizen.org/feature/screen.width", 720);
   SetSystemInfo("http://tizen.org/feature/screen.height", 1280);
-  SetPreference("memory/sysman/mmc", 0);
+  SetStorageCard(false);
 }
 
 }  // namespace sim

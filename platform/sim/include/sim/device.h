@@ -132,6 +132,12 @@ class Device {
 
   void SetPreference(const std::string& key, int value);
   void RemovePreference(const std::string& key);
+  // The storage-card status deviced keeps as a preference: 1 with a card in,
+  // 0 without; SetStorageCardStatus stores any value the platform might hold,
+  // ClearStorageCard leaves none.
+  void SetStorageCard(bool inserted);
+  void SetStorageCardStatus(int status);
+  void ClearStorageCard();
   // An integer platform feature such as "http://tizen.org/feature/screen.width".
   void SetSystemInfo(const std::string& key, int value);
 
@@ -146,6 +152,9 @@ class Device {
   // connection while e_dbus is initialised. Returns the handlers called.
   int SendBusSignal(const std::string& path, const std::string& interface,
                     const std::string& member, const std::string& sender = ":1.1");
+  // deviced's "BootingDone", sent once the phone has booted. Returns the
+  // handlers called.
+  int SendBootDone();
   int BusInitCount() const;
   int BusSubscriptions() const;
 
