@@ -653,7 +653,11 @@ std::vector<std::string> Args::List(const std::string& name) const {
 }
 
 const std::vector<Command>& Commands() {
-  static const std::vector<Command> commands = MakeCommands();
+  static const std::vector<Command> commands = [] {
+    std::vector<Command> all = MakeCommands();
+    for (Command& c : DeviceCommands()) all.push_back(c);
+    return all;
+  }();
   return commands;
 }
 

@@ -55,6 +55,9 @@ struct Command {
   std::function<void(Session&, const Args&)> run;
 };
 
+// `save` and `load` (device-state.cpp).
+std::vector<Command> DeviceCommands();
+
 const std::vector<Command>& Commands();
 // The command, or null.
 const Command* FindCommand(const std::string& name);

@@ -19,6 +19,8 @@
 
 #include "cli.h"
 #include "demo-story.h"
+#include "demo.h"
+#include "device-state.h"
 #include "session.h"
 #include "sim/device.h"
 
@@ -26,34 +28,78 @@ namespace po = boost::program_options;
 
 namespace {
 
-// Lays out the device under |root|, or under a fresh temporary folder when
-// |root| is empty (then |root| becomes its path). False, said on stderr, when
-// that cannot be done.
-bool UseDeviceRoot(std::string& root) {
-  if (root.empty()) {
-    char pattern[] = "/tmp/korrin-sim-XXXXXX";
-    if (mkdtemp(pattern) == NULL) {
+// Where this run's device lives: the folder --root names, or a fresh
+// temporary one under $TMPDIR that goes at exit unless --keep. A kept root
+// keeps the phone too (ROOT/device.ksim, beside its database), and a run that
+// starts on a root holding one finds the phone as it was left.
+struct DeviceRoot {
+  std::string path;
+  bool temporary;
+  bool keep;
+  bool kept() const { return !temporary || keep; }
+};
+
+// Lays out the device under |root|, making a temporary root when it names
+// none. False, said on stderr, when that cannot be done.
+bool UseDeviceRoot(DeviceRoot& root) {
+  if (root.temporary) {
+    const char* tmp = getenv("TMPDIR");
+    std::string pattern = std::string(tmp != NULL && *tmp ? tmp : "/tmp") + "/korrin-sim-XXXXXX";
+    std::vector<char> path(pattern.begin(), pattern.end());
+    path.push_back('\0');
+    if (mkdtemp(path.data()) == NULL) {
       std::cerr << "korrin-sim: cannot make a device root: " << strerror(errno) << "\n";
       return false;
     }
-    root = pattern;
+    root.path = path.data();
   }
-  if (!sim::Device::Get().UseRoot(root)) {
-    std::cerr << "korrin-sim: cannot lay out a device under " << root << "\n";
+  if (!sim::Device::Get().UseRoot(root.path)) {
+    std::cerr << "korrin-sim: cannot lay out a device under " << root.path << "\n";
     return false;
+  }
+  std::string phone = korrin_sim::DeviceFile(root.path);
+  if (!root.temporary && std::filesystem::exists(phone)) {
+    try {
+      korrin_sim::LoadDevice(phone);
+    } catch (const std::exception& e) {
+      std::cerr << "korrin-sim: " << e.what() << "\n";
+      return false;
+    }
   }
   return true;
 }
 
-int Demo(std::string root) {
-  if (!UseDeviceRoot(root)) return 1;
-  std::cout << "device root: " << root << "\n";
-  korrin_sim::Session session(/*printActions=*/false);
-  std::istringstream story(kDemoStory);
-  return session.RunScript(story, "demo", std::cerr) ? 0 : 1;
+// Writes the phone to |root|'s device file; a failure is said, not fatal.
+void SaveDevice(const std::string& root) {
+  try {
+    korrin_sim::SaveDevice(korrin_sim::DeviceFile(root));
+  } catch (const std::exception& e) {
+    std::cerr << "korrin-sim: " << e.what() << "\n";
+  }
 }
 
-int Run(std::string root, const std::vector<std::string>& files) {
+// Ends a run with |status|: a kept root keeps the phone, and a temporary one
+// goes, unless |inspect| keeps it (with its phone) to be looked into.
+int Leave(const DeviceRoot& root, int status, bool inspect = false) {
+  if (root.kept() || inspect) SaveDevice(root.path);
+  if (root.kept()) return status;
+  if (inspect) {
+    std::cerr << "korrin-sim: the device is left in " << root.path << "\n";
+  } else {
+    std::error_code ignored;
+    std::filesystem::remove_all(root.path, ignored);
+  }
+  return status;
+}
+
+int Demo(DeviceRoot root) {
+  if (!UseDeviceRoot(root)) return 1;
+  if (root.kept()) std::cout << "device root: " << root.path << "\n";
+  std::istringstream story(kDemoStory);
+  return Leave(root, korrin_sim::PlayDemo(story, std::cout, isatty(STDOUT_FILENO)) ? 0 : 1);
+}
+
+int Run(DeviceRoot root, const std::vector<std::string>& files) {
   if (files.empty()) {
     std::cerr << "korrin-sim: run what? usage: korrin-sim run [--root DIR] FILE...\n";
     return 2;
@@ -64,18 +110,14 @@ int Run(std::string root, const std::vector<std::string>& files) {
       return 1;
     }
   }
-  bool temporary = root.empty();
   if (!UseDeviceRoot(root)) return 1;
   korrin_sim::Session session;
   for (const std::string& file : files) {
     std::ifstream in(file);
-    if (!session.RunScript(in, file, std::cerr)) {
-      if (temporary) std::cerr << "korrin-sim: the device is left in " << root << "\n";
-      return 1;
-    }
+    // A failed script keeps its temporary root, to be looked into.
+    if (!session.RunScript(in, file, std::cerr)) return Leave(root, 1, /*inspect=*/true);
   }
-  if (temporary) std::filesystem::remove_all(root);
-  return 0;
+  return Leave(root, 0);
 }
 
 // One line from the terminal with editing and history, or from a pipe.
@@ -89,10 +131,11 @@ bool ReadLine(const char* prompt, std::string& line) {
   return true;
 }
 
-int Shell(std::string root) {
+int Shell(DeviceRoot root) {
   if (!UseDeviceRoot(root)) return 1;
-  std::cout << "korrin-sim shell on the device in " << root
-            << "\n`help` lists the commands; Ctrl-D ends.\n";
+  std::cout << "korrin-sim shell on the device in " << root.path
+            << (root.kept() ? "" : " (removed at exit; --keep keeps it)")
+            << "\n`help` lists the commands; Ctrl-D or `quit` ends.\n";
   const char* home = getenv("HOME");
   std::string history = std::string(home != NULL ? home : ".") + "/.korrin_sim_history";
   read_history(history.c_str());
@@ -102,6 +145,7 @@ int Shell(std::string root) {
   std::string line;
   for (bool more = true; more;) {
     more = ReadLine(fed == Fed::kCollected ? "  ...> " : "korrin> ", line);
+    if (more && fed != Fed::kCollected && (line == "quit" || line == "exit")) more = false;
     try {
       fed = more ? session.Feed(line) : session.Finish();
       if (fed == Fed::kChecked) std::cout << "as expected\n";
@@ -110,9 +154,10 @@ int Shell(std::string root) {
       std::cout << std::flush;
       std::cerr << e.what() << std::endl;
     }
+    if (fed == Fed::kRan && root.kept()) SaveDevice(root.path);  // a few kilobytes: the phone survives a kill
   }
   write_history(history.c_str());
-  return 0;
+  return Leave(root, 0);
 }
 
 }  // namespace
@@ -120,7 +165,8 @@ int Shell(std::string root) {
 int main(int argc, char** argv) {
   po::options_description visible("options");
   visible.add_options()("root", po::value<std::string>()->value_name("DIR"),
-                        "keep the device (and its database) in DIR")("help", "list the commands");
+                        "keep the device (its phone and database) in DIR")(
+      "keep", "keep the temporary device folder at exit")("help", "list the commands");
   po::options_description all;
   all.add(visible).add_options()("mode", po::value<std::string>()->default_value("demo"))(
       "files", po::value<std::vector<std::string> >());
@@ -135,7 +181,8 @@ int main(int argc, char** argv) {
     return 2;
   }
   std::string mode = values["mode"].as<std::string>();
-  std::string root = values.count("root") ? values["root"].as<std::string>() : "";
+  DeviceRoot root{values.count("root") ? values["root"].as<std::string>() : "",
+                  values.count("root") == 0, values.count("keep") > 0};
   std::vector<std::string> files =
       values.count("files") ? values["files"].as<std::vector<std::string> >()
                             : std::vector<std::string>();

@@ -204,6 +204,19 @@ class Device {
   // the device holds.
   void LoadSampleDevice();
 
+  // ---- The phone's state beyond its packages, for tools that save a device
+  // and bring it back (korrin-sim's `save` and `load`).
+
+  const std::map<std::string, int>& Preferences() const;
+  // Keys without their leading "http://".
+  const std::map<std::string, int>& SystemInfo() const;
+  bool MdmReachable() const;
+  const std::map<std::string, mdm_status_t>& MdmStates() const;
+  // Removes every package, preference and system-information key and makes
+  // device management reachable with everything allowed, silently (no event).
+  // Logs, failures, call counts and handles stay.
+  void ClearPhone();
+
  private:
   Device();
   Device(const Device&);
