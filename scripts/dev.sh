@@ -107,7 +107,15 @@ prepare_arm_sysroot() {
 case "${1:-}" in
   demo)
     install_missing_packages
-    build build
+    # Only korrin-sim, quietly: cmake's output goes to a log shown on failure.
+    mkdir -p build
+    echo "dev.sh: building korrin-sim (log in build/demo-build.log)" >&2
+    if ! { cmake -S . -B build && cmake --build build -j"$(nproc)" --target korrin-sim; } \
+        >build/demo-build.log 2>&1; then
+      tail -n 40 build/demo-build.log >&2
+      echo "dev.sh: the build failed; the whole log is build/demo-build.log" >&2
+      exit 1
+    fi
     exec build/tools/korrin-sim/korrin-sim demo
     ;;
   test)

@@ -670,11 +670,14 @@ po::options_description VisibleOptions(const Command& command) {
 }
 
 void PrintCommandList(std::ostream& out) {
-  out << "usage: korrin-sim [demo] [--root DIR]\n"
-         "       korrin-sim run [--root DIR] FILE...\n"
-         "       korrin-sim shell [--root DIR]\n"
+  out << "usage: korrin-sim [demo] [--root DIR | --keep]\n"
+         "       korrin-sim run [--root DIR | --keep] FILE...\n"
+         "       korrin-sim shell [--root DIR | --keep]\n"
          "       korrin-sim help [COMMAND]\n\n"
-         "Without --root, the device lives in a fresh temporary folder.\n"
+         "Without --root, the device lives in a fresh folder under $TMPDIR (/tmp),\n"
+         "removed at exit unless --keep (or a failed `run`, which says so). A kept\n"
+         "root keeps the phone in ROOT/device.ksim beside its database, and the next\n"
+         "run on that root starts with both.\n"
          "Scripts hold one command per line; # starts a comment line.\n\n"
          "commands:\n";
   for (const Command& command : Commands()) PrintSummary(command, out);
