@@ -26,4 +26,7 @@ TEST(DemoTest, EndsWellWithinEightyColumns) {
     EXPECT_LE(width, 80u) << line;
   }
   EXPECT_GT(count, 50) << output;
+  // Each step's command, and the cells changed since the previous view.
+  EXPECT_NE(std::string::npos, output.find("$ install com.lumaforge.skyharbor \"Sky Harbor\"\n"));
+  EXPECT_NE(std::string::npos, output.find(" 9 | Mossback Rally   |*Sky Harbor\n"));
 }

@@ -82,6 +82,9 @@ void SaveDevice(const std::string& root) {
 // goes, unless |inspect| keeps it (with its phone) to be looked into.
 int Leave(const DeviceRoot& root, int status, bool inspect = false) {
   if (root.kept() || inspect) SaveDevice(root.path);
+  if (root.temporary && root.keep) {
+    std::cerr << "korrin-sim: the device is kept in " << root.path << "\n";
+  }
   if (root.kept()) return status;
   if (inspect) {
     std::cerr << "korrin-sim: the device is left in " << root.path << "\n";
