@@ -25,6 +25,7 @@
 #include "korrin-data/korrin-data.h"
 #include "log-client-manager/log-client-manager.h"
 #include "system-info/system-info.h"
+#include "words.h"
 
 namespace korrin_sim {
 
@@ -669,7 +670,12 @@ std::vector<const Operation*> Find(const std::string& name) {
       found.push_back(&candidate);
     }
   }
-  if (found.empty()) throw UsageError("no operation " + name + " (call --list shows them)");
+  if (found.empty()) {
+    std::vector<std::string> names;
+    for (const Operation& known : kOperations) names.push_back(known.name);
+    std::string hint = DidYouMean(op, names);
+    throw UsageError("no operation " + name + (hint.empty() ? " (call --list shows them)" : hint));
+  }
   return found;
 }
 

@@ -59,13 +59,13 @@ int ParseNamed(const std::string& text, const std::vector<std::string>& names,
   std::string all;
   for (size_t i = 0; i < names.size(); ++i) {
     if (text == names[i]) return static_cast<int>(i);
-    all += (i > 0 ? "|" : "") + names[i];
+    all += (i > 0 ? ", " : "") + names[i];
   }
-  if (!numbers) throw UsageError(what + ": '" + text + "' is not " + all);
+  if (!numbers) throw UsageError(what + ": '" + text + "' is not one of: " + all);
   try {
     return ParseInt(text, what);
   } catch (const UsageError&) {
-    throw UsageError(what + ": '" + text + "' is not " + all + " or a number");
+    throw UsageError(what + ": '" + text + "' is not a number or one of: " + all);
   }
 }
 

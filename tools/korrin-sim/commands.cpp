@@ -12,6 +12,7 @@
 #include "session.h"
 #include "sim/device.h"
 #include "views.h"
+#include "words.h"
 
 namespace po = boost::program_options;
 
@@ -155,7 +156,8 @@ std::vector<sim::App>::iterator FindApp(sim::Package& pkg, const std::string& ap
 
 void RunGame(Session&, const Args& args) {
   sim::Package pkg = sim::MakePackage(
-      args.Text("APPID"), {sim::GameApp(args.Text("APPID"), args.Text("LABEL"))});
+      args.Text("APPID"),
+      {sim::GameApp(args.Text("APPID"), args.Text(args.Has("LABEL") ? "LABEL" : "APPID"))});
   ApplyAppOptions(args, pkg.apps[0]);
   ApplyPackageOptions(args, pkg);
   Dev().AddPackage(pkg);
@@ -252,7 +254,7 @@ void RunPreference(Session&, const Args& args) {
 }
 
 void RunCard(Session&, const Args& args) {
-  Dev().SetStorageCard(ParseNamed(args.Text("in|out"), {"out", "in"}, "in|out") != 0);
+  Dev().SetStorageCard(ParseNamed(args.Text("in|out"), {"in", "out"}, "card") == 0);
 }
 
 void RunScreen(Session&, const Args& args) {
@@ -263,8 +265,8 @@ void RunScreen(Session&, const Args& args) {
 }
 
 void RunMdm(Session&, const Args& args) {
-  bool reachable = ParseNamed(args.Text("reachable|unreachable"), {"unreachable", "reachable"},
-                              "reachable|unreachable");
+  bool reachable =
+      ParseNamed(args.Text("reachable|unreachable"), {"unreachable", "reachable"}, "mdm");
   std::map<std::string, mdm_status_t> states;
   for (const std::string& pair : args.List("APPID=STATE")) {
     size_t equals = pair.find('=');
@@ -284,7 +286,7 @@ void RunFail(Session&, const Args& args) {
   std::string call = args.Text("CALL");
   int error = ParseInt(args.Text("ERROR"), "ERROR");
   std::string how = args.Has("once|always") ? args.Text("once|always") : "once";
-  bool always = ParseNamed(how, {"once", "always"}, "once|always") != 0;
+  bool always = ParseNamed(how, {"once", "always"}, "fail") != 0;
   try {
     if (always) {
       Dev().FailAlways(call, error);
@@ -349,7 +351,7 @@ void RunCount(Session&, const Args& args) {
 
 void RunTrace(Session& session, const Args& args) {
   if (args.Has("on|off")) {
-    session.Trace(ParseNamed(args.Text("on|off"), {"off", "on"}, "on|off") != 0);
+    session.Trace(ParseNamed(args.Text("on|off"), {"off", "on"}, "trace") != 0);
   } else {
     for (const std::string& sql : session.TakeStatements()) Out() << sql << "\n";
   }
@@ -431,9 +433,9 @@ std::vector<Command> MakeCommands() {
        "Adds the sample device's packages (a few dozen games, other applications, a\n"
        "no-display service, a deactivated package), a 720x1280 screen, no card.",
        "sample-device", kAction, kParsed, NoOptions, RunSampleDevice},
-      {"game", "APPID LABEL", "add a game package to the device (no event)",
-       "Installs, silently, a package APPID holding one game APPID labelled LABEL.\n"
-       "Options change its properties.",
+      {"game", "APPID [LABEL]", "add a game package to the device (no event)",
+       "Installs, silently, a package APPID holding one game APPID labelled LABEL\n"
+       "(or APPID). Options change its properties (--label too).",
        "game com.acme.tetra \"Tetra Blocks\" --preload", kAction, kParsed, AddBothOptions,
        RunGame},
       {"package", "PKGID", "add or change a package (no event)",
@@ -619,6 +621,12 @@ const std::vector<Command>& Topics() {
        "count. A difference stops the script with a diff.",
        "layout\nexpect\nmenu 1 \"Apps\"\npage 1\n 1 | Tetra Blocks\nend", false,
        Command::kOptions, NoOptions, nullptr},
+      {"quoting", "", "quotes and backslashes: how words split", kQuotingHelp,
+       "install com.acme.c \"Don't Starve\" --preload\n"
+       "game com.acme.o 'O'\\''Brien \"the\" Racer'\n"
+       "call InsertMenuData name=$'two\\nlines' type=0\n"
+       "game com.acme.x --label \"\"",
+       false, Command::kOptions, NoOptions, nullptr},
   };
   return topics;
 }
@@ -671,14 +679,16 @@ po::options_description VisibleOptions(const Command& command) {
 
 void PrintCommandList(std::ostream& out) {
   out << "usage: korrin-sim [demo] [--root DIR | --keep]\n"
-         "       korrin-sim run [--root DIR | --keep] FILE...\n"
+         "       korrin-sim run [--root DIR | --keep] FILE...    (FILE - is standard input)\n"
          "       korrin-sim shell [--root DIR | --keep]\n"
-         "       korrin-sim help [COMMAND]\n\n"
+         "       korrin-sim help [COMMAND]\n"
+         "       korrin-sim --version\n\n"
          "Without --root, the device lives in a fresh folder under $TMPDIR (/tmp),\n"
          "removed at exit unless --keep (or a failed `run`, which says so). A kept\n"
          "root keeps the phone in ROOT/device.ksim beside its database, and the next\n"
          "run on that root starts with both.\n"
-         "Scripts hold one command per line; # starts a comment line.\n\n"
+         "Scripts hold one command per line; # starts a comment line. Words split\n"
+         "as in the POSIX shell, nothing expanded: `help quoting`.\n\n"
          "commands:\n";
   for (const Command& command : Commands()) PrintSummary(command, out);
   for (const Command& topic : Topics()) PrintSummary(topic, out);
@@ -700,10 +710,18 @@ void PrintCommandList(std::ostream& out) {
 void PrintCommandHelp(const std::string& name, std::ostream& out) {
   const Command* command = FindCommand(name);
   if (command == NULL) command = Named(Topics(), name);
-  if (command == NULL) throw UsageError("no command '" + name + "' (`help` lists them)");
-  out << "usage: " << command->name << (command->args.empty() ? "" : " " + command->args)
-      << "\n\n"
-      << command->details << "\n";
+  if (command == NULL) {
+    std::vector<std::string> names;
+    for (const Command& known : Commands()) names.push_back(known.name);
+    for (const Command& topic : Topics()) names.push_back(topic.name);
+    std::string hint = DidYouMean(name, names);
+    throw UsageError("no command '" + name + "'" + (hint.empty() ? " (`help` lists them)" : hint));
+  }
+  if (command->name != "quoting") {  // a topic, not a line to write
+    out << "usage: " << command->name << (command->args.empty() ? "" : " " + command->args)
+        << "\n\n";
+  }
+  out << command->details << "\n";
   po::options_description options = VisibleOptions(*command);
   if (!options.options().empty()) out << "\n" << options;
   if (command->name == "call") {

@@ -14,6 +14,7 @@
 #include "commands.h"
 #include "common/device-path.h"
 #include "korrin-data/korrin-data.h"
+#include "words.h"
 
 namespace po = boost::program_options;
 
@@ -88,6 +89,15 @@ void Parse(const Command& command, const std::vector<std::string>& words,
     po::store(po::command_line_parser(words).options(all).positional(order).style(style).run(),
               values);
     po::notify(values);
+  } catch (const po::unknown_option& e) {
+    po::options_description visible = VisibleOptions(command);
+    std::vector<std::string> known;
+    for (const auto& option : visible.options()) {
+      known.push_back("--" + option->long_name());
+    }
+    std::string word = e.get_option_name();
+    throw UsageError(command.name + ": unknown option '" + word + "'" +
+                     DidYouMean(word.substr(0, word.find('=')), known));
   } catch (const po::error& e) {
     throw UsageError(command.name + ": " + e.what());
   }
@@ -96,14 +106,6 @@ void Parse(const Command& command, const std::vector<std::string>& words,
       throw UsageError(command.name + ": missing " + p.name + " (usage: " + command.name +
                        " " + command.args + ")");
     }
-  }
-}
-
-std::vector<std::string> SplitWords(const std::string& line) {
-  try {
-    return po::split_unix(line);
-  } catch (const std::exception& e) {
-    throw UsageError(std::string("cannot split the line into words: ") + e.what());
   }
 }
 
@@ -199,7 +201,11 @@ Session::Prepared Session::Prepare(const std::string& line) const {
   name = name.substr(0, name.find_first_of(" \t"));
   prepared.command = FindCommand(name);
   if (prepared.command == NULL) {
-    throw UsageError("unknown command '" + name + "' (`help` lists the commands)");
+    std::vector<std::string> names;
+    for (const Command& command : Commands()) names.push_back(command.name);
+    std::string hint = DidYouMean(name, names);
+    throw UsageError("unknown command '" + name + "'" +
+                     (hint.empty() ? " (`help` lists the commands)" : hint));
   }
   prepared.rest = RestOfLine(line);
   if (prepared.command->parsing != Command::kText) prepared.words = SplitWords(prepared.rest);
