@@ -656,6 +656,7 @@ const std::vector<Command>& Commands() {
   static const std::vector<Command> commands = [] {
     std::vector<Command> all = MakeCommands();
     for (Command& c : DeviceCommands()) all.push_back(c);
+    for (Command& c : LayoutCommands()) all.push_back(c);
     return all;
   }();
   return commands;

@@ -1,5 +1,8 @@
 #include "session.h"
 
+#include <ctype.h>
+#include <dlog.h>
+
 #include <algorithm>
 #include <iostream>
 #include <sstream>
@@ -154,7 +157,69 @@ bool IsComment(const std::string& line) {
   return first != std::string::npos && line[first] == '#';
 }
 
+// Whether the engine wrote |line| as a failure. The engine logs much at error
+// priority that is only information ("#Step 1", "Name[...]", "appId[...]"), so
+// a line counts only when its message says that something went wrong.
+bool FailureLogged(const sim::LogLine& line) {
+  static const char* const kMarkers[] = {"error", "fail", "cannot", "invalid", "err :",
+                                         "return [", "no page [", "no box ["};
+  if (line.priority < DLOG_ERROR) return false;
+  size_t prefix = line.text.find(") >  ");
+  std::string text = line.text.substr(prefix == std::string::npos ? 0 : prefix + 5);
+  std::transform(text.begin(), text.end(), text.begin(),
+                 [](unsigned char c) { return std::tolower(c); });
+  for (const char* marker : kMarkers) {
+    if (text.find(marker) != std::string::npos) return true;
+  }
+  return false;
+}
+
+bool IsNameStart(char c) { return std::isalpha(static_cast<unsigned char>(c)) != 0; }
+bool IsNameChar(char c) { return std::isalnum(static_cast<unsigned char>(c)) != 0 || c == '_'; }
+
 }  // namespace
+
+void Session::Bind(const std::string& name, int id) {
+  if (name.empty() || !IsNameStart(name[0]) ||
+      !std::all_of(name.begin(), name.end(), IsNameChar)) {
+    throw UsageError("'" + name + "' is not a name: letters, digits and _, a letter first");
+  }
+  if (name == "last") throw UsageError("$last is the last insert's id; `let` another name");
+  names_[name] = id;
+}
+
+std::string Session::Expand(const std::string& line) const {
+  std::string out;
+  for (size_t i = 0; i < line.size(); ++i) {
+    if (line[i] != '$' || i + 1 == line.size() || !IsNameStart(line[i + 1])) {
+      out += line[i];
+      continue;
+    }
+    size_t end = i + 1;
+    while (end < line.size() && IsNameChar(line[end])) ++end;
+    std::string name = line.substr(i + 1, end - i - 1);
+    std::map<std::string, int>::const_iterator bound = names_.find(name);
+    if (bound == names_.end()) {
+      throw UsageError("$" + name + " is not bound" +
+                       (name == "last" ? ": nothing was inserted yet"
+                                       : ": `let " + name + " = COMMAND` binds it"));
+    }
+    out += std::to_string(bound->second);
+    i = end - 1;
+  }
+  return out;
+}
+
+void Session::ReportFailures(size_t logMark, bool action) const {
+  const std::vector<sim::LogLine>& logs = sim::Device::Get().Logs();
+  size_t failures = 0;
+  for (size_t i = logMark; i < logs.size(); ++i) failures += FailureLogged(logs[i]);
+  if (failures == 0) return;
+  std::cout << std::flush;
+  std::cerr << where_ << failures << (failures == 1 ? " failure" : " failures")
+            << " logged by the engine (`log " << (action ? "" : "--all ")
+            << "--priority E` shows them)" << std::endl;
+}
 
 Session::Session(bool printActions, bool recordChanges)
     : printActions_(printActions), recordChanges_(recordChanges), tracing_(false), logMark_(0) {}
@@ -193,8 +258,9 @@ void Session::FollowStoreTrace() {
 
 std::string Session::DatabasePath() const { return korrin::DevicePath(korrin::kGameDataDbPath); }
 
-Session::Prepared Session::Prepare(const std::string& line) const {
+Session::Prepared Session::Prepare(const std::string& written) const {
   Prepared prepared;
+  std::string line = Expand(written);
   std::string name = line.substr(line.find_first_not_of(" \t"));
   name = name.substr(0, name.find_first_of(" \t"));
   prepared.command = FindCommand(name);
@@ -223,14 +289,21 @@ void Session::Execute(const std::string& line) {
   std::ostringstream output;
   SetOut(&output);
   FollowStoreTrace();
+  returned_.reset();
+  TakeReturnedId(NULL);  // one a failed command left
+  ++depth_;
   try {
     command.run(*this, Args(prepared.values, prepared.words, prepared.rest));
   } catch (...) {
+    --depth_;
     SetOut(&outer);
     beforeError_ = nullptr;  // the command's own error is the one to tell
     throw;
   }
+  --depth_;
   SetOut(&outer);
+  int id = 0;
+  if (TakeReturnedId(&id)) returned_ = names_["last"] = id;
   if (beforeError_) std::rethrow_exception(std::exchange(beforeError_, nullptr));
   lastOutput_ = output.str();
   if (command.action) {
@@ -243,6 +316,7 @@ void Session::Execute(const std::string& line) {
   } else if (printActions_ || !command.action) {
     std::cout << lastOutput_ << std::flush;
   }
+  if (depth_ == 0) ReportFailures(logMark, command.action);
 }
 
 void Session::RunBefore(const std::string& call, const std::string& line) {
@@ -312,10 +386,13 @@ bool Session::RunScript(std::istream& in, const std::string& file, std::ostream&
     while (std::getline(in, line)) {
       ++number;
       if (!block_) at = number;
+      where_ = file + ":" + std::to_string(number) + ": ";
       Feed(line);
     }
     Finish();
+    where_.clear();
   } catch (const std::exception& e) {
+    where_.clear();
     std::cout << std::flush;
     errors << file << ":" << at << ": " << e.what() << std::endl;
     return false;
