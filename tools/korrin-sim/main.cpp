@@ -166,6 +166,10 @@ int Shell(DeviceRoot root) {
 }  // namespace
 
 int main(int argc, char** argv) {
+  // korrin-sim counts the engine's failures after each command and keeps the
+  // log for `log`: it echoes the log only when KORRIN_SIM_LOG asks.
+  const char* echo = getenv("KORRIN_SIM_LOG");
+  if (echo == NULL || *echo == '\0') sim::Device::Get().EchoLogs(false);
   po::options_description visible("options");
   visible.add_options()("root", po::value<std::string>()->value_name("DIR"),
                         "keep the device (its phone and database) in DIR")(

@@ -168,6 +168,13 @@ bool FailureLogged(const sim::LogLine& line) {
   std::string text = line.text.substr(prefix == std::string::npos ? 0 : prefix + 5);
   std::transform(text.begin(), text.end(), text.begin(),
                  [](unsigned char c) { return std::tolower(c); });
+  // Information in a failure's words: a call that worked and said no (its
+  // code 0: "app_info_is_game FAILED [0] [0]" for an application that is no
+  // game), and the look-up every install makes before placing a new box.
+  static const char* const kNotFailures[] = {"failed [0]", "cannot find box with appid"};
+  for (const char* words : kNotFailures) {
+    if (text.find(words) != std::string::npos) return false;
+  }
   for (const char* marker : kMarkers) {
     if (text.find(marker) != std::string::npos) return true;
   }
@@ -191,6 +198,10 @@ void Session::Bind(const std::string& name, int id) {
 std::string Session::Expand(const std::string& line) const {
   std::string out;
   for (size_t i = 0; i < line.size(); ++i) {
+    if (line[i] == '\\' && i + 1 < line.size() && line[i + 1] == '$') {
+      out += line[++i];  // \$ is a $, as the shell has it
+      continue;
+    }
     if (line[i] != '$' || i + 1 == line.size() || !IsNameStart(line[i + 1])) {
       out += line[i];
       continue;

@@ -70,7 +70,7 @@ class Session {
   // The id the last command run handed back (an insert's), if it did.
   std::optional<int> returned() const { return returned_; }
   // |line| with each $NAME replaced by its id; throws UsageError naming an
-  // unbound one. A $ not followed by a letter stays as it is.
+  // unbound one. A $ not followed by a letter stays as it is; \$ is a $.
   std::string Expand(const std::string& line) const;
 
   // ---- For the commands.
