@@ -561,7 +561,7 @@ std::vector<Command> MakeCommands() {
        "before `start` or after `start --without boot-signal`, it says so.",
        "boot-done", kAction, kParsed, NoOptions, RunBootDone},
       // ---- The engine.
-      {"start", "", "start the launcher: the engine, the boot signal, the card",
+      {"start", "", "the launcher start-up: engine, boot signal, card",
        "Does what the launcher application does at start-up:\n"
        "  engine       data_engin_initialization(): the first launch lays every game\n"
        "               out in menu 1 \"Apps\"\n"
