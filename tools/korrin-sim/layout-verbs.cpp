@@ -234,11 +234,9 @@ void RunLet(Session& session, const Args& args) {
     session.Bind(name, ParseInt(command, "ID"));
     return;
   }
-  session.Bind(name, 0);  // refuses a bad name before the command runs
+  session.CheckName(name);  // before the command runs
   session.Execute(command);
-  if (!session.returned()) {
-    throw UsageError("`" + command + "` handed back no id: $" + name + " is 0");
-  }
+  if (!session.returned()) throw UsageError("`" + command + "` handed back no id to bind");
   session.Bind(name, *session.returned());
 }
 

@@ -187,12 +187,16 @@ bool IsNameChar(char c) { return std::isalnum(static_cast<unsigned char>(c)) != 
 }  // namespace
 
 void Session::Bind(const std::string& name, int id) {
+  CheckName(name);
+  names_[name] = id;
+}
+
+void Session::CheckName(const std::string& name) const {
   if (name.empty() || !IsNameStart(name[0]) ||
       !std::all_of(name.begin(), name.end(), IsNameChar)) {
     throw UsageError("'" + name + "' is not a name: letters, digits and _, a letter first");
   }
   if (name == "last") throw UsageError("$last is the last insert's id; `let` another name");
-  names_[name] = id;
 }
 
 std::string Session::Expand(const std::string& line) const {

@@ -67,6 +67,7 @@ class Session {
   // Binds $NAME to |id|. Throws UsageError for a NAME that is not a word of
   // letters, digits and _ starting with a letter, or for "last".
   void Bind(const std::string& name, int id);
+  void CheckName(const std::string& name) const;  // throws as Bind does
   // The id the last command run handed back (an insert's), if it did.
   std::optional<int> returned() const { return returned_; }
   // |line| with each $NAME replaced by its id; throws UsageError naming an
