@@ -6,6 +6,7 @@
 
 #include <iostream>
 #include <limits>
+#include <utility>
 
 namespace korrin_sim {
 
@@ -32,6 +33,21 @@ long long ParseRange(const std::string& text, const std::string& what, long long
 std::ostream& Out() { return *g_out; }
 
 void SetOut(std::ostream* out) { g_out = out != NULL ? out : &std::cout; }
+
+namespace {
+bool g_returned = false;
+int g_returnedId = 0;
+}  // namespace
+
+void ReturnId(int id) {
+  g_returned = true;
+  g_returnedId = id;
+}
+
+bool TakeReturnedId(int* id) {
+  if (g_returned && id != NULL) *id = g_returnedId;
+  return std::exchange(g_returned, false);
+}
 
 int ParseInt(const std::string& text, const std::string& what) {
   return static_cast<int>(ParseRange(text, what, std::numeric_limits<int>::min(),

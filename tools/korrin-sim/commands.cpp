@@ -240,9 +240,22 @@ void RunEvent(Session&, const Args& args) {
                          args.Get<int>("progress"), args.Get<int>("error"));
 }
 
+// What `start` did, for `boot-done` and `card` to tell and follow.
+bool g_started = false;
+bool g_watchingCard = false;       // the launcher's watch on the card status
+int g_subscriptionsAtStart = -1;  // e_dbus_signal_handler_add calls; -1 when start subscribed
+
 void RunBootDone(Session&, const Args&) {
   int handlers = Dev().SendBootDone();
-  Out() << "BootingDone reached " << handlers << (handlers == 1 ? " handler\n" : " handlers\n");
+  Out() << "BootingDone reached " << handlers << (handlers == 1 ? " handler" : " handlers");
+  if (handlers == 0 && !g_started) {
+    Out() << ": the engine is not started (`start` subscribes)";
+  } else if (handlers == 0 &&
+             Dev().CallCount("e_dbus_signal_handler_add") == g_subscriptionsAtStart) {
+    Out() << ": `start --without boot-signal` left the subscription out "
+             "(`call _RegisterEdbusSignalHandler` makes it)";
+  }
+  Out() << "\n";
 }
 
 void RunPreference(Session&, const Args& args) {
@@ -254,7 +267,9 @@ void RunPreference(Session&, const Args& args) {
 }
 
 void RunCard(Session&, const Args& args) {
-  Dev().SetStorageCard(ParseNamed(args.Text("in|out"), {"in", "out"}, "card") == 0);
+  bool inserted = ParseNamed(args.Text("in|out"), {"in", "out"}, "card") == 0;
+  Dev().SetStorageCard(inserted);
+  if (g_watchingCard) korrin::PackageManager().OnMMCStatusChanged(inserted ? 1 : 0);
 }
 
 void RunScreen(Session&, const Args& args) {
@@ -298,7 +313,25 @@ void RunFail(Session&, const Args& args) {
   }
 }
 
-void RunStart(Session&, const Args&) { data_engin_initialization(); }
+// The steps of the launcher's start-up after the engine's own, by name.
+const std::vector<std::string> kStartSteps = {"boot-signal", "card-watch"};
+
+void RunStart(Session&, const Args& args) {
+  std::vector<std::string> without = args.List("without");
+  for (const std::string& step : without) ParseNamed(step, kStartSteps, "--without");
+  auto wanted = [&](const char* step) {
+    return std::find(without.begin(), without.end(), step) == without.end();
+  };
+  data_engin_initialization();
+  g_started = true;
+  g_subscriptionsAtStart = -1;
+  if (wanted("boot-signal") && !korrin::PackageManager()._RegisterEdbusSignalHandler()) {
+    Out() << "boot-signal: the subscription failed (`log` says why)\n";
+  } else if (!wanted("boot-signal")) {
+    g_subscriptionsAtStart = Dev().CallCount("e_dbus_signal_handler_add");
+  }
+  g_watchingCard = wanted("card-watch");
+}
 
 void RunStop(Session&, const Args&) { data_engin_uninitialization(); }
 
@@ -461,7 +494,9 @@ std::vector<Command> MakeCommands() {
        "Sets preference KEY to the integer VALUE; without VALUE removes it.",
        "preference memory/sysman/mmc 1", kAction, kParsed, NoOptions, RunPreference},
       {"card", "in|out", "insert or pull the storage card",
-       "Sets the storage-card status (preference memory/sysman/mmc): 1 in, 0 out.",
+       "Sets the storage-card status (preference memory/sysman/mmc): 1 in, 0 out.\n"
+       "After `start` (unless --without card-watch) the launcher sees the change and\n"
+       "calls OnMMCStatusChanged with it.",
        "card out", kAction, kParsed, NoOptions,
        RunCard},
       {"screen", "WIDTH HEIGHT", "set the screen size",
@@ -523,13 +558,26 @@ std::vector<Command> MakeCommands() {
        },
        RunEvent},
       {"boot-done", "", "send the BootingDone signal on the system bus",
-       "Sends deviced's BootingDone signal and says how many handlers it reached.",
+       "Sends deviced's BootingDone signal and says how many handlers it reached;\n"
+       "`start` subscribes the engine, for the first signal only. Reaching none\n"
+       "before `start` or after `start --without boot-signal`, it says so.",
        "boot-done", kAction, kParsed, NoOptions, RunBootDone},
       // ---- The engine.
-      {"start", "", "start the engine: data_engin_initialization()",
-       "Calls data_engin_initialization() as the launcher does at start-up: the first\n"
-       "launch lays every game out in menu 1 \"Apps\".",
-       "start", kAction, kParsed, NoOptions, RunStart},
+      {"start", "", "the launcher start-up: engine, boot signal, card",
+       "Does what the launcher application does at start-up:\n"
+       "  engine       data_engin_initialization(): the first launch lays every game\n"
+       "               out in menu 1 \"Apps\"\n"
+       "  boot-signal  _RegisterEdbusSignalHandler(): `boot-done` reaches the engine,\n"
+       "               which then looks up again the applications on the card\n"
+       "  card-watch   the launcher watches the card status: `card in|out` calls\n"
+       "               OnMMCStatusChanged(1|0)\n"
+       "--without STEP leaves boot-signal or card-watch out, to make it by hand.",
+       "start\nstart --without boot-signal --without card-watch", kAction, kParsed,
+       [](po::options_description& o) {
+         o.add_options()("without", po::value<std::vector<std::string> >()->value_name("STEP"),
+                         "leave boot-signal or card-watch out (repeat for both)");
+       },
+       RunStart},
       {"stop", "", "data_engin_uninitialization()",
        "Calls data_engin_uninitialization(), which does nothing: the managers live\n"
        "until the process ends.",
@@ -577,7 +625,13 @@ std::vector<Command> MakeCommands() {
       {"log", "", "show the platform log",
        "Shows the log lines the last command that changed something wrote (--all:\n"
        "every line), as P/tag: text, a newline in a text as \\n. --message leaves out\n"
-       "the \"file: function(line) >  \" prefix.",
+       "the \"file: function(line) >  \" prefix.\n"
+       "After each command, korrin-sim says on stderr how many failures the engine\n"
+       "logged. The engine logs much information at error priority (E/), so only E/\n"
+       "lines that say something went wrong count: \"error\", \"fail\", \"cannot\",\n"
+       "\"invalid\", \"Err :\", \"return [\", \"No page [\", \"No box [\"; not a call that\n"
+       "said no with code 0 (\"FAILED [0]\") nor the look-up for an existing box that\n"
+       "every install makes (\"cannot find box with appid\").",
        "log --priority E --grep \"Do not add\"", kView, kParsed,
        [](po::options_description& o) {
          o.add_options()("priority", po::value<std::string>()->value_name("V|D|I|W|E|F"),
@@ -664,6 +718,7 @@ const std::vector<Command>& Commands() {
   static const std::vector<Command> commands = [] {
     std::vector<Command> all = MakeCommands();
     for (Command& c : DeviceCommands()) all.push_back(c);
+    for (Command& c : LayoutCommands()) all.push_back(c);
     return all;
   }();
   return commands;

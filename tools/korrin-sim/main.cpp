@@ -202,6 +202,10 @@ int main(int argc, char** argv) {
   if (argc >= 2 && strcmp(argv[1], "help") == 0) {
     return Help(std::vector<std::string>(argv + 2, argv + argc));
   }
+  // korrin-sim counts the engine's failures after each command and keeps the
+  // log for `log`: it echoes the log only when KORRIN_SIM_LOG asks.
+  const char* echo = getenv("KORRIN_SIM_LOG");
+  if (echo == NULL || *echo == '\0') sim::Device::Get().EchoLogs(false);
   po::options_description visible("options");
   visible.add_options()("root", po::value<std::string>()->value_name("DIR"),
                         "keep the device (its phone and database) in DIR")(

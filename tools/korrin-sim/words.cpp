@@ -5,6 +5,7 @@
 // knows C escapes instead), so this small splitter is our own.
 #include "words.h"
 
+#include <ctype.h>
 #include <stdio.h>
 #include <string.h>
 
@@ -52,7 +53,25 @@ void DollarEscape(const std::string& line, size_t& i, std::string& word) {
 
 }  // namespace
 
-std::vector<std::string> SplitWords(const std::string& line) {
+namespace {
+
+bool IsNameStart(char c) { return isalpha(static_cast<unsigned char>(c)) != 0; }
+bool IsNameChar(char c) { return isalnum(static_cast<unsigned char>(c)) || c == '_'; }
+
+// At line[i] == '$' followed by a name: appends its value and leaves |i| on
+// the name's last character. False, changing nothing, when no name follows.
+bool ExpandName(const std::string& line, size_t& i, const NameValue& value, std::string& word) {
+  if (!value || i + 1 == line.size() || !IsNameStart(line[i + 1])) return false;
+  size_t end = i + 1;
+  while (end < line.size() && IsNameChar(line[end])) ++end;
+  word += value(line.substr(i + 1, end - i - 1));
+  i = end - 1;
+  return true;
+}
+
+}  // namespace
+
+std::vector<std::string> SplitWords(const std::string& line, const NameValue& value) {
   std::vector<std::string> words;
   std::string word;
   bool inWord = false;  // a quoted empty part makes a word too
@@ -76,8 +95,10 @@ std::vector<std::string> SplitWords(const std::string& line) {
       i = close;
     } else if (c == '"') {
       for (++i; i < line.size() && line[i] != '"'; ++i) {
-        if (line[i] == '\\' && i + 1 < line.size() && (line[i + 1] == '"' || line[i + 1] == '\\')) {
+        if (line[i] == '\\' && i + 1 < line.size() && strchr("\"\\$", line[i + 1]) != NULL) {
           ++i;
+        } else if (line[i] == '$' && ExpandName(line, i, value, word)) {
+          continue;
         }
         word += line[i];
       }
@@ -91,7 +112,7 @@ std::vector<std::string> SplitWords(const std::string& line) {
         }
       }
       if (i == line.size()) Unterminated("$'...' quote", line, opened);
-    } else {
+    } else if (!(c == '$' && ExpandName(line, i, value, word))) {
       word += c;
     }
   }

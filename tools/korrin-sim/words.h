@@ -4,6 +4,7 @@
 #ifndef KORRIN_SIM_WORDS_H_
 #define KORRIN_SIM_WORDS_H_
 
+#include <functional>
 #include <string>
 #include <vector>
 
@@ -15,7 +16,11 @@ namespace korrin_sim {
 // backslash; $'...' takes \n, \t, \r, \xHH, \\, \' and \" (POSIX.1-2024);
 // adjacent parts join into one word, and "" is an empty word. Throws
 // UsageError for an unterminated quote or a trailing backslash.
-std::vector<std::string> SplitWords(const std::string& line);
+//
+// With |value|, $NAME outside single quotes is replaced by value(NAME) (which
+// may throw), and "\$" inside double quotes is a $.
+typedef std::function<std::string(const std::string& name)> NameValue;
+std::vector<std::string> SplitWords(const std::string& line, const NameValue& value = NameValue());
 
 // |text| as one word that SplitWords reads back as |text|: as it is when
 // plain, else in single quotes, or as $'...' when it holds control bytes.

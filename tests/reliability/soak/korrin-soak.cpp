@@ -259,7 +259,7 @@ class Generator {
           Emit("before app_info_filter_destroy install " + Arg(pkgId));
         }
         model.Start(pkg.id.empty() ? NULL : &pkg);
-        return Emit("start");
+        return Emit("start --without boot-signal --without card-watch");  // BootDone subscribes
       case 8: return BootDone(model);
       case 9: return Emit("call InsertPageData parentId=1 pageNo=" + std::to_string(++model.pages));
     }
