@@ -650,6 +650,10 @@ const std::vector<Command>& Topics() {
        "count. A difference stops the script with a diff.",
        "layout\nexpect\nmenu 1 \"Apps\"\npage 1\n 1 | Tetra Blocks\nend", false,
        Command::kOptions, NoOptions, nullptr},
+      {"quit", "", "end the shell, or the script here (also exit, .quit)",
+       "Ends the shell as Ctrl-D does; in a script, ends that script there: the\n"
+       "lines after it do not run.",
+       "quit", false, Command::kOptions, NoOptions, nullptr},
   };
   return topics;
 }
