@@ -189,6 +189,7 @@ void SetUpTerminal() {
 // One line from the terminal with editing and history, or from a pipe.
 bool ReadLine(const char* prompt, std::string& line) {
   if (!isatty(STDIN_FILENO)) return static_cast<bool>(std::getline(std::cin, line));
+  interrupted = 0;  // a Ctrl-C while a command ran is not one for this line
   char* text = readline(prompt);
   while (interrupted) {
     interrupted = 0;
