@@ -2,9 +2,12 @@
 // workstation. It plays the demo story, scenario scripts, or commands typed
 // into a shell; `korrin-sim --help` lists the commands.
 #include <errno.h>
+#include <locale.h>
+#include <signal.h>
 #include <stdlib.h>
 #include <string.h>
 #include <unistd.h>
+#include <wchar.h>
 
 #include <editline/readline.h>
 
@@ -19,6 +22,7 @@
 
 #include "calls.h"
 #include "cli.h"
+#include "complete.h"
 #include "demo-story.h"
 #include "demo.h"
 #include "device-state.h"
@@ -135,11 +139,79 @@ int Run(DeviceRoot root, const std::vector<std::string>& files) {
   return Leave(root, 0);
 }
 
+// Ctrl-C drops the line being typed and prompts afresh, as a shell does.
+// libedit's own handler would only pass the signal on, which ends the session,
+// so the shell reads keys itself: an interrupted read ends the line as Enter
+// does, and ReadLine throws that line away.
+volatile sig_atomic_t interrupted = 0;
+
+void OnInterrupt(int) { interrupted = 1; }
+
+// One character for libedit, which takes the value returned as the character
+// itself: UTF-8 is decoded here.
+int ReadKey(FILE*) {
+  mbstate_t state;
+  memset(&state, 0, sizeof state);
+  for (;;) {
+    char byte;
+    ssize_t got = read(STDIN_FILENO, &byte, 1);
+    if (got < 0 && errno == EINTR) {
+      if (interrupted) return '\n';
+      continue;
+    }
+    if (got <= 0) return -1;
+    wchar_t c;
+    size_t length = mbrtowc(&c, &byte, 1, &state);
+    if (length == static_cast<size_t>(-2)) continue;
+    if (length == static_cast<size_t>(-1)) return static_cast<unsigned char>(byte);
+    return static_cast<int>(c);
+  }
+}
+
+// Tab: the words korrin_sim::Completions offers where the cursor is, never
+// file names.
+char* NextCompletion(const char* word, int state) {
+  static std::vector<std::string> matches;
+  static size_t next;
+  if (state == 0) {
+    size_t start = static_cast<size_t>(rl_point) - strlen(word);
+    matches = korrin_sim::Completions(std::string(rl_line_buffer, start), word);
+    next = 0;
+  }
+  return next < matches.size() ? strdup(matches[next++].c_str()) : NULL;
+}
+
+char** CompleteWord(const char* word, int, int) {
+  rl_attempted_completion_over = 1;
+  return rl_completion_matches(word, NextCompletion);
+}
+
+void SetUpTerminal() {
+  setlocale(LC_CTYPE, "C.UTF-8");  // libedit shows and edits UTF-8 only in such a locale
+  rl_catch_signals = 0;
+  rl_getc_function = ReadKey;
+  rl_attempted_completion_function = CompleteWord;
+  struct sigaction action;
+  memset(&action, 0, sizeof action);
+  action.sa_handler = OnInterrupt;
+  sigemptyset(&action.sa_mask);
+  sigaction(SIGINT, &action, NULL);
+}
+
 // One line from the terminal with editing and history, or from a pipe.
 bool ReadLine(const char* prompt, std::string& line) {
   if (!isatty(STDIN_FILENO)) return static_cast<bool>(std::getline(std::cin, line));
+  interrupted = 0;  // a Ctrl-C while a command ran is not one for this line
   char* text = readline(prompt);
-  if (text == NULL) return false;
+  while (interrupted) {
+    interrupted = 0;
+    free(text);
+    text = readline(prompt);
+  }
+  if (text == NULL) {
+    std::cout << std::endl;  // Ctrl-D leaves the terminal's prompt on a line of its own
+    return false;
+  }
   line = text;
   free(text);
   if (!line.empty()) add_history(line.c_str());
@@ -153,6 +225,7 @@ int Shell(DeviceRoot root) {
             << "\n`help` lists the commands; Ctrl-D or `quit` ends.\n";
   const char* home = getenv("HOME");
   std::string history = std::string(home != NULL ? home : ".") + "/.korrin_sim_history";
+  if (isatty(STDIN_FILENO)) SetUpTerminal();  // before libedit starts, in read_history
   read_history(history.c_str());
   korrin_sim::Session session;
   using Fed = korrin_sim::Session::Fed;
@@ -160,7 +233,7 @@ int Shell(DeviceRoot root) {
   std::string line;
   for (bool more = true; more;) {
     more = ReadLine(fed == Fed::kCollected ? "  ...> " : "korrin> ", line);
-    if (more && fed != Fed::kCollected && (line == "quit" || line == "exit")) more = false;
+    if (more && fed != Fed::kCollected && korrin_sim::Session::IsQuit(line)) more = false;
     try {
       fed = more ? session.Feed(line) : session.Finish();
       if (fed == Fed::kChecked) std::cout << "as expected\n";
