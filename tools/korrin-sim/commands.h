@@ -57,6 +57,8 @@ struct Command {
 
 // `save` and `load` (device-state.cpp).
 std::vector<Command> DeviceCommands();
+// schema, sql, export, import, check and replay-log (phone-db.cpp).
+std::vector<Command> PhonedbCommands();
 
 const std::vector<Command>& Commands();
 // The command, or null.
