@@ -1,10 +1,11 @@
 // The integrity check of a layout: what the rows say against what a launcher
 // needs of them, each problem one line naming the rows, so that a person can
 // act on it. It reads rows only; import runs it on a file before writing.
+#include <algorithm>
 #include <map>
 #include <optional>
 #include <set>
-#include <sstream>
+#include <tuple>
 
 #include "cli.h"
 #include "phone-db.h"
@@ -199,8 +200,17 @@ std::vector<Finding> CheckDatabase(const Connection& db) {
     if (have.empty()) {
       add(std::string("schema: no table ") + table);
     } else if (have != want) {
-      add(std::string("schema: table ") + table + " has (" + Joined(have) + "), the store makes (" +
-          Joined(want) + ")");
+      std::vector<std::string> extra, missing;
+      for (const std::string& c : have) {
+        if (std::find(want.begin(), want.end(), c) == want.end()) extra.push_back(c);
+      }
+      for (const std::string& c : want) {
+        if (std::find(have.begin(), have.end(), c) == have.end()) missing.push_back(c);
+      }
+      std::string prefix = std::string("schema: table ") + table;
+      if (!extra.empty()) add(prefix + " has columns the store does not make: " + Joined(extra));
+      if (!missing.empty()) add(prefix + " lacks columns: " + Joined(missing));
+      if (extra.empty() && missing.empty()) add(prefix + " has its columns in another order");
     }
   }
   std::string mode = db.Rows("PRAGMA journal_mode")[0].begin()->get<std::string>();
