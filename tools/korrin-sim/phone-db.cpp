@@ -499,7 +499,7 @@ void NoOptions(po::options_description&) {}
 std::vector<Command> PhonedbCommands() {
   const bool kAction = true, kView = false;
   return {
-      {"schema", "", "show the layout database's schema and journal mode",
+      {"schema", "", "show the database's schema and journal mode",
        "Prints the SQL of every table and index of the layout database (the one\n"
        "`open` or --db gave, else the device's), then its journal mode.",
        "schema", kView, Command::kOptions, NoOptions, RunSchema},
