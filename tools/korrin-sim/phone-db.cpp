@@ -176,8 +176,11 @@ void RunSchema(Session& session, const Args&) {
                                  "ORDER BY rowid")) {
     Out() << row["sql"].get<std::string>() << ";\n";
   }
-  Out() << "-- journal_mode: " << db.Rows("PRAGMA journal_mode")[0].begin()->get<std::string>()
-        << "\n";
+  // A file records only whether it is in WAL mode; PERSIST is a setting of
+  // each connection, which the store makes as it opens.
+  bool wal = db.Rows("PRAGMA journal_mode")[0].begin()->get<std::string>() == "wal";
+  Out() << (wal ? "-- journal: wal (the launcher uses persist)\n"
+                : "-- journal: rollback (the store sets persist on its connection)\n");
 }
 
 std::string Shown(const Json& value) {

@@ -55,3 +55,12 @@ schema: table Pages has columns the store does not make: extra TEXT
 schema: table Boxes lacks columns: content TEXT
 journal mode is wal; the launcher uses persist
 integrity_check: row 1 missing from index BoxApp" check --db ${SCRIPTS}/broken.db)
+
+# A field log in dlogutil's formats gives its jobs, and they play on the copy.
+sim(0 "" replay-log ${SCRIPTS}/field.log)
+file(READ ${SCRIPTS}/field-replay.ksim want)
+string(REPLACE "${SCRIPTS}/" "" out "${out}")
+if(NOT out STREQUAL want)
+  message(FATAL_ERROR "replay-log of field.log:\n${out}")
+endif()
+sim(0 "" open copy.db ${SCRIPTS}/field-replay.ksim)
