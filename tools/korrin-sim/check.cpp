@@ -45,6 +45,7 @@ class Checker {
     for (const Json& menu : layout_.menus.rows) menus_.insert(IntOr0(menu, "menuId"));
     for (const Json& page : layout_.pages.rows) pages_[IntOr0(page, "pageId")] = &page;
     for (const Json& box : layout_.boxes.rows) {
+      boxes_.insert(IntOr0(box, "boxId"));
       if (IntOr0(box, "isFolder")) folders_.insert(IntOr0(box, "boxId"));
     }
     Boxes();
@@ -98,8 +99,8 @@ class Checker {
       bool isFolder = IntOr0(page, "isFolder") != 0;
       int64_t parentId = IntOr0(page, "parentId");
       if (isFolder && !folders_.count(parentId)) {
-        Add('p', id, name + " belongs to folder box " + std::to_string(parentId) +
-                         ", which is not a folder box");
+        Add('p', id, name + " belongs to folder box " + std::to_string(parentId) + ", which " +
+                         (boxes_.count(parentId) ? "is not a folder" : "does not exist"));
       } else if (!isFolder && !menus_.count(parentId)) {
         Add('p', id, name + " belongs to menu " + std::to_string(parentId) +
                          ", which does not exist");
@@ -165,6 +166,7 @@ class Checker {
   const Layout& layout_;
   std::set<int64_t> menus_;
   std::map<int64_t, const Json*> pages_;
+  std::set<int64_t> boxes_;
   std::set<int64_t> folders_;
   std::map<int64_t, int> boxesOnPage_;
   std::vector<Finding> findings_;
