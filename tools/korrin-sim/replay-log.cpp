@@ -148,6 +148,11 @@ int ReplayLog(std::istream& log, const std::string& name, std::ostream& out) {
   while (std::getline(log, line)) {
     ++number;
     if (!line.empty() && line.back() == '\r') line.pop_back();
+    // Most of a phone's log is other lines: pass them before any pattern.
+    if (line.find("#Step 3") == std::string::npos && line.find("appId[") == std::string::npos &&
+        line.find("#8") == std::string::npos && line.find("#9") == std::string::npos) {
+      continue;
+    }
     std::string text = Message(line);
     std::smatch match;
     if (std::regex_match(text, match, kPrefix)) {
