@@ -9,6 +9,7 @@
 #include "calls.h"
 #include "cli.h"
 #include "korrin-data/korrin-data.h"
+#include "phone-db.h"
 #include "session.h"
 #include "sim/device.h"
 #include "views.h"
@@ -453,7 +454,11 @@ void RunLog(Session& session, const Args& args) {
     const sim::LogLine& line = lines[i];
     if (line.priority < lowest) continue;
     if (args.Has("grep") && line.text.find(args.Text("grep")) == std::string::npos) continue;
-    PrintLogLine(line, args.Get<bool>("message"), Out());
+    if (args.Get<bool>("dlogutil")) {
+      PrintDlogutilLine(line, Out());
+    } else {
+      PrintLogLine(line, args.Get<bool>("message"), Out());
+    }
   }
 }
 
@@ -667,7 +672,8 @@ std::vector<Command> MakeCommands() {
                          "this priority and above")(
              "grep", po::value<std::string>()->value_name("TEXT"), "lines holding TEXT")(
              "all", po::bool_switch(), "every line since the start")(
-             "message", po::bool_switch(), "leave out the file, function and line");
+             "message", po::bool_switch(), "leave out the file, function and line")(
+             "dlogutil", po::bool_switch(), "as a phone's `dlogutil -v brief` prints it");
        },
        RunLog},
       {"trace", "[on|off]", "record the SQL the store runs, or show it",
@@ -754,6 +760,7 @@ const std::vector<Command>& Commands() {
     std::vector<Command> all = MakeCommands();
     for (Command& c : DeviceCommands()) all.push_back(c);
     for (Command& c : LayoutCommands()) all.push_back(c);
+    for (Command& c : PhonedbCommands()) all.push_back(c);
     return all;
   }();
   return commands;
@@ -771,12 +778,18 @@ void PrintCommandList(std::ostream& out) {
   out << "usage: korrin-sim [demo] [--root DIR | --keep]\n"
          "       korrin-sim run [--root DIR | --keep] FILE...    (FILE - is standard input)\n"
          "       korrin-sim shell [--root DIR | --keep]\n"
+         "       korrin-sim open FILE [SCRIPT...] [--in-place] [--root DIR | --keep]\n"
+         "       korrin-sim COMMAND [ARG...] [--db FILE [--in-place]]\n"
          "       korrin-sim help [COMMAND]\n"
          "       korrin-sim --version\n\n"
          "Without --root, the device lives in a fresh folder under $TMPDIR (/tmp),\n"
          "removed at exit unless --keep (or a failed `run`, which says so). A kept\n"
          "root keeps the phone in ROOT/device.ksim beside its database, and the next\n"
          "run on that root starts with both.\n"
+         "`open` plays the scripts (or a shell) on a phone's layout database FILE: on\n"
+         "a copy, or with --in-place on FILE itself; `start` opens it in the engine.\n"
+         "A COMMAND alone runs once, with --db on a copy of FILE: `korrin-sim check\n"
+         "--db phone.db` exits 1 when it finds a problem.\n"
          "Scripts hold one command per line; # starts a comment line. Words split\n"
          "as in the POSIX shell, nothing expanded: `help quoting`.\n\n"
          "commands:\n";

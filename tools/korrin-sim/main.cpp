@@ -26,6 +26,7 @@
 #include "demo-story.h"
 #include "demo.h"
 #include "device-state.h"
+#include "phone-db.h"
 #include "session.h"
 #include "sim/device.h"
 #include "words.h"
@@ -101,6 +102,26 @@ int Leave(const DeviceRoot& root, int status, bool inspect = false) {
   return status;
 }
 
+// The phone's database that `open` and --db bring in: the device root's
+// database becomes a copy of |file|, or the file itself with |inPlace|.
+struct Opened {
+  std::string file;
+  bool inPlace;
+};
+
+// Places |opened| (when given) under the root UseDeviceRoot laid out; false,
+// said on stderr, when it cannot.
+bool Place(const Opened* opened) {
+  if (opened == NULL) return true;
+  try {
+    korrin_sim::PlaceDatabase(opened->file, opened->inPlace);
+  } catch (const std::exception& e) {
+    std::cerr << "korrin-sim: " << e.what() << "\n";
+    return false;
+  }
+  return true;
+}
+
 int Demo(DeviceRoot root) {
   if (!UseDeviceRoot(root)) return 1;
   if (root.kept()) std::cout << "device root: " << root.path << "\n";
@@ -108,7 +129,7 @@ int Demo(DeviceRoot root) {
   return Leave(root, korrin_sim::PlayDemo(story, std::cout, isatty(STDOUT_FILENO)) ? 0 : 1);
 }
 
-int Run(DeviceRoot root, const std::vector<std::string>& files) {
+int Run(DeviceRoot root, const std::vector<std::string>& files, const Opened* opened = NULL) {
   if (files.empty()) {
     std::cerr << "korrin-sim: run what? usage: korrin-sim run [--root DIR] FILE... (-: stdin)\n";
     return 2;
@@ -126,6 +147,7 @@ int Run(DeviceRoot root, const std::vector<std::string>& files) {
     }
   }
   if (!UseDeviceRoot(root)) return 1;
+  if (!Place(opened)) return Leave(root, 1);
   korrin_sim::Session session;
   for (const std::string& file : files) {
     std::ifstream opened;
@@ -218,8 +240,15 @@ bool ReadLine(const char* prompt, std::string& line) {
   return true;
 }
 
-int Shell(DeviceRoot root) {
+int Shell(DeviceRoot root, const Opened* opened = NULL) {
   if (!UseDeviceRoot(root)) return 1;
+  if (!Place(opened)) return Leave(root, 1);
+  if (opened != NULL) {
+    std::cout << "the database of " << opened->file
+              << (opened->inPlace ? " itself (--in-place): changes go to the file\n"
+                                  : " as a copy: the file stays as it is\n")
+              << "`start` opens it in the engine (for downloads, alphabetical, events)\n";
+  }
   std::cout << "korrin-sim shell on the device in " << root.path
             << (root.kept() ? "" : " (removed at exit; --keep keeps it)")
             << "\n`help` lists the commands; Ctrl-D or `quit` ends.\n";
@@ -269,6 +298,51 @@ int Help(const std::vector<std::string>& words) {
   }
 }
 
+// `korrin-sim COMMAND [ARGS] [--db FILE [--in-place]]`: one command, on a
+// phone's database when --db names one, in a device root of its own.
+int OneShot(int argc, char** argv) {
+  const korrin_sim::Command& command = *korrin_sim::FindCommand(argv[1]);
+  po::options_description own;
+  own.add_options()("db", po::value<std::string>())("in-place", po::bool_switch())(
+      "root", po::value<std::string>())("keep", po::bool_switch());
+  po::variables_map values;
+  std::vector<std::string> words;
+  try {
+    po::parsed_options parsed = po::command_line_parser(argc - 1, argv + 1)
+                                    .options(own)
+                                    .style(po::command_line_style::unix_style &
+                                           ~po::command_line_style::allow_guessing)
+                                    .allow_unregistered()
+                                    .run();
+    po::store(parsed, values);
+    words = po::collect_unrecognized(parsed.options, po::include_positional);
+  } catch (const po::error& e) {
+    std::cerr << "korrin-sim: " << e.what() << " (korrin-sim --help)\n";
+    return 2;
+  }
+  std::string line = command.name;
+  for (const std::string& word : words) {
+    line += " " + (command.parsing == korrin_sim::Command::kText ? word : korrin_sim::ShellWord(word));
+  }
+  DeviceRoot root{values.count("root") ? values["root"].as<std::string>() : "",
+                  values.count("root") == 0, values["keep"].as<bool>()};
+  if (!UseDeviceRoot(root)) return 1;
+  Opened opened{values.count("db") ? values["db"].as<std::string>() : "",
+                values["in-place"].as<bool>()};
+  if (!Place(values.count("db") ? &opened : NULL)) return Leave(root, 1);
+  korrin_sim::Session session;
+  try {
+    // These views are the engine's own answers: it needs the database open.
+    if (command.name == "downloads" || command.name == "alphabetical") session.Execute("start");
+    session.Execute(line);
+  } catch (const std::exception& e) {
+    std::cout << std::flush;
+    std::cerr << "korrin-sim: " << e.what() << "\n";
+    return Leave(root, 1);
+  }
+  return Leave(root, 0);
+}
+
 }  // namespace
 
 int main(int argc, char** argv) {
@@ -279,10 +353,12 @@ int main(int argc, char** argv) {
   // log for `log`: it echoes the log only when KORRIN_SIM_LOG asks.
   const char* echo = getenv("KORRIN_SIM_LOG");
   if (echo == NULL || *echo == '\0') sim::Device::Get().EchoLogs(false);
+  if (argc > 1 && korrin_sim::FindCommand(argv[1]) != NULL) return OneShot(argc, argv);
   po::options_description visible("options");
   visible.add_options()("root", po::value<std::string>()->value_name("DIR"),
                         "keep the device (its phone and database) in DIR")(
-      "keep", "keep the temporary device folder at exit")("help", "list the commands")(
+      "keep", "keep the temporary device folder at exit")(
+      "in-place", "open: change FILE itself, not a copy")("help", "list the commands")(
       "version", "print korrin-sim's version and the library's");
   po::options_description all;
   all.add(visible).add_options()("mode", po::value<std::string>()->default_value("demo"))(
@@ -295,7 +371,7 @@ int main(int argc, char** argv) {
     po::notify(values);
   } catch (const po::unknown_option& e) {
     std::cerr << "korrin-sim: unknown option '" << e.get_option_name() << "'"
-              << korrin_sim::DidYouMean(e.get_option_name(), {"--root", "--keep", "--help", "--version"})
+              << korrin_sim::DidYouMean(e.get_option_name(), {"--root", "--keep", "--in-place", "--help", "--version"})
               << " (korrin-sim --help)\n";
     return 2;
   } catch (const po::error& e) {
@@ -315,9 +391,18 @@ int main(int argc, char** argv) {
   if (values.count("help")) return Help({});
   if (mode == "help") return Help(files);
   if (mode == "run") return Run(root, files);
+  if (mode == "open") {
+    if (files.empty()) {
+      std::cerr << "korrin-sim: open what? usage: korrin-sim open FILE [SCRIPT...]\n";
+      return 2;
+    }
+    Opened opened{files[0], values.count("in-place") > 0};
+    std::vector<std::string> scripts(files.begin() + 1, files.end());
+    return scripts.empty() ? Shell(root, &opened) : Run(root, scripts, &opened);
+  }
   if (mode != "demo" && mode != "shell") {
     std::cerr << "korrin-sim: unknown mode '" << mode << "'"
-              << korrin_sim::DidYouMean(mode, {"demo", "run", "shell", "help"})
+              << korrin_sim::DidYouMean(mode, {"demo", "run", "shell", "open", "help"})
               << " (korrin-sim --help)\n";
     return 2;
   }
