@@ -21,6 +21,7 @@
 #include "demo-story.h"
 #include "demo.h"
 #include "device-state.h"
+#include "serve.h"
 #include "session.h"
 #include "sim/device.h"
 
@@ -134,6 +135,12 @@ bool ReadLine(const char* prompt, std::string& line) {
   return true;
 }
 
+int Serve(DeviceRoot root, const korrin_sim::ServeOptions& options) {
+  if (!UseDeviceRoot(root)) return 1;
+  korrin_sim::Session session;
+  return Leave(root, korrin_sim::Serve(session, options));
+}
+
 int Shell(DeviceRoot root) {
   if (!UseDeviceRoot(root)) return 1;
   std::cout << "korrin-sim shell on the device in " << root.path
@@ -169,7 +176,11 @@ int main(int argc, char** argv) {
   po::options_description visible("options");
   visible.add_options()("root", po::value<std::string>()->value_name("DIR"),
                         "keep the device (its phone and database) in DIR")(
-      "keep", "keep the temporary device folder at exit")("help", "list the commands");
+      "keep", "keep the temporary device folder at exit")(
+      "port", po::value<int>()->default_value(8080)->value_name("N"),
+      "serve: the port on 127.0.0.1 (0: any free one)")(
+      "script", po::value<std::string>()->value_name("FILE"), "serve: play FILE first")(
+      "help", "list the commands");
   po::options_description all;
   all.add(visible).add_options()("mode", po::value<std::string>()->default_value("demo"))(
       "files", po::value<std::vector<std::string> >());
@@ -205,6 +216,12 @@ int main(int argc, char** argv) {
   if (mode == "demo" && files.empty()) return Demo(root);
   if (mode == "run") return Run(root, files);
   if (mode == "shell" && files.empty()) return Shell(root);
+  if (mode == "serve" && files.empty()) {
+    korrin_sim::ServeOptions serve;
+    serve.port = values["port"].as<int>();
+    if (values.count("script")) serve.script = values["script"].as<std::string>();
+    return Serve(root, serve);
+  }
   std::cerr << "korrin-sim: unknown mode or extra words (korrin-sim --help)\n";
   return 2;
 }
