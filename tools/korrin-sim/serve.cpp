@@ -83,35 +83,49 @@ class Reader {
 std::string Text(const json& value) { return value.is_string() ? value.get<std::string>() : ""; }
 int Int(const json& value) { return value.is_number_integer() ? value.get<int>() : 0; }
 
-// What a box shows, with the facts the screen draws it by.
-json BoxJson(int id, bool isFolder, int boxType, const std::string& appId, const std::string& name,
-             int col, int row) {
-  json box = {{"id", id},       {"col", col},         {"row", row},
-              {"folder", isFolder}, {"shortcut", boxType == kShortcutBoxType},
-              {"appId", appId}, {"name", name}};
-  std::string label = BoxLabel(isFolder, boxType, appId, name);
-  if (isFolder || boxType == kShortcutBoxType) label = label.substr(1, label.size() - 2);
-  box["label"] = label;
-  bool icon = isFolder;
-  bool disabled = false;
-  bool deactivated = false;
-  if (!isFolder && boxType != kShortcutBoxType) {
-    const sim::App* app = sim::Device::Get().FindApp(appId);
-    icon = app != NULL && app->icon && !app->icon->empty();
-    disabled = app != NULL && !app->enabled;
+// The phone's applications by id, with whether their package is deactivated.
+class AppIndex {
+ public:
+  AppIndex() {
     for (const sim::Package& pkg : sim::Device::Get().Packages()) {
-      for (const sim::App& a : pkg.apps) deactivated |= a.id == appId && pkg.disabled;
+      for (const sim::App& app : pkg.apps) apps_[app.id] = std::make_pair(&app, pkg.disabled);
     }
-    box["installed"] = app != NULL;
   }
-  box["icon"] = icon;
-  box["disabled"] = disabled;
-  box["deactivated"] = deactivated;
+  // The application, or null; |*deactivated| says whether its package is.
+  const sim::App* Find(const std::string& appId, bool* deactivated) const {
+    std::map<std::string, std::pair<const sim::App*, bool> >::const_iterator it = apps_.find(appId);
+    *deactivated = it != apps_.end() && it->second.second;
+    return it != apps_.end() ? it->second.first : NULL;
+  }
+
+ private:
+  std::map<std::string, std::pair<const sim::App*, bool> > apps_;
+};
+
+// What a box shows, with the facts the screen draws it by: whether it has an
+// icon, and whether its application is disabled or its package deactivated.
+json BoxJson(const AppIndex& apps, int id, bool isFolder, int boxType, const std::string& appId,
+             const std::string& name, int col, int row) {
+  bool shortcut = boxType == kShortcutBoxType;
+  std::string label = BoxLabel(isFolder, boxType, appId, name);
+  if (isFolder || shortcut) label = label.substr(1, label.size() - 2);  // no [] or <>
+  // Flags only when set: a home screen of 10,000 boxes stays a small answer.
+  json box = {{"id", id}, {"col", col}, {"row", row}, {"label", label}};
+  if (!appId.empty()) box["appId"] = appId;
+  if (isFolder) box["folder"] = true;
+  if (shortcut) box["shortcut"] = true;
+  bool deactivated = false;
+  const sim::App* app = isFolder || shortcut ? NULL : apps.Find(appId, &deactivated);
+  if (!isFolder && !shortcut && (app == NULL || !app->icon || app->icon->empty())) {
+    box["noIcon"] = true;
+  }
+  if (app != NULL && !app->enabled) box["disabled"] = true;
+  if (deactivated) box["deactivated"] = true;
   return box;
 }
 
 // Menus with their pages, and folders with theirs, each page with its boxes.
-json LayoutJson(const std::string& dbPath) {
+json LayoutJson(const std::string& dbPath, const AppIndex& apps) {
   Reader db(dbPath);
   std::map<int, json> pages;  // pageId -> page
   for (const json& p : db.Rows("SELECT pageId, isFolder, parentId, pageNo FROM Pages "
@@ -124,7 +138,7 @@ json LayoutJson(const std::string& dbPath) {
     std::map<int, json>::iterator page = pages.find(Int(b[2]));
     if (page == pages.end()) continue;  // a box without a page is not on any screen
     page->second["boxes"].push_back(
-        BoxJson(Int(b[0]), Int(b[1]) != 0, Int(b[7]), Text(b[3]), Text(b[4]), Int(b[5]), Int(b[6])));
+        BoxJson(apps, Int(b[0]), Int(b[1]) != 0, Int(b[7]), Text(b[3]), Text(b[4]), Int(b[5]), Int(b[6])));
   }
   json menus = json::array();
   json folders = json::object();
@@ -144,14 +158,14 @@ json LayoutJson(const std::string& dbPath) {
 }
 
 // A computed view's pages, each with the boxes the library put on it.
-json ViewJson(const std::vector<boost::shared_ptr<GamePageData> >& pages,
+json ViewJson(const AppIndex& apps, const std::vector<boost::shared_ptr<GamePageData> >& pages,
               const std::vector<boost::shared_ptr<GameBoxData> >& boxes) {
   json view = json::array();
   for (const boost::shared_ptr<GamePageData>& page : pages) {
     json boxesOnPage = json::array();
     for (const boost::shared_ptr<GameBoxData>& box : boxes) {
       if (box->pageId != page->pageId) continue;
-      boxesOnPage.push_back(BoxJson(box->boxId, box->isFolder, box->boxType, box->appId, box->name,
+      boxesOnPage.push_back(BoxJson(apps, box->boxId, box->isFolder, box->boxType, box->appId, box->name,
                                     box->col, box->row));
     }
     view.push_back({{"id", page->pageId}, {"no", page->pageNo}, {"boxes", boxesOnPage}});
@@ -159,14 +173,20 @@ json ViewJson(const std::vector<boost::shared_ptr<GamePageData> >& pages,
   return view;
 }
 
-// The download and alphabetical views of menu 1, when the engine has a store.
-json ComputedViewsJson() {
+// One of the library's views of menu 1 (alphabetical or downloads), when the
+// engine has a store; null otherwise.
+json ComputedViewJson(const AppIndex& apps, const std::string& name) {
   LauncherDataManager& store = korrin::DataManager();
-  if (store.m_db == NULL) return json::object();
-  return {{"alphabetical", ViewJson(store.GetPageDataListByAlphabeticalOrder(1, false),
-                                    store.GetBoxDataListByAlphabeticalOrder(1, false))},
-          {"downloads", ViewJson(store.GetPageDataListByDownload(1, false),
-                                 store.GetBoxDataListByDownload(1, false))}};
+  if (store.m_db == NULL) return nullptr;
+  if (name == "alphabetical") {
+    return ViewJson(apps, store.GetPageDataListByAlphabeticalOrder(1, false),
+                    store.GetBoxDataListByAlphabeticalOrder(1, false));
+  }
+  if (name == "downloads") {
+    return ViewJson(apps, store.GetPageDataListByDownload(1, false),
+                    store.GetBoxDataListByDownload(1, false));
+  }
+  return nullptr;
 }
 
 json LogJson() {
@@ -196,9 +216,12 @@ json AppsJson() {
 
 json ErrorJson(const std::string& message) { return {{"error", message}}; }
 
+// With its charset named, cpp-httplib leaves a JSON answer uncompressed: on the
+// loopback address, compressing a large home screen costs far more than
+// sending it.
 void Reply(httplib::Response& res, int status, const json& body) {
   res.status = status;
-  res.set_content(body.dump(), "application/json");
+  res.set_content(body.dump(), "application/json; charset=utf-8");
 }
 
 // ---- The server: one session, one request at a time.
@@ -240,7 +263,8 @@ class Server {
   }
 
  private:
-  // The whole state, or, when the page already has version |since|, the
+  // The whole state (with the computed view named by "view", if any), or,
+  // when the page already has version |since|, the
   // first change after it (a long poll), or "unchanged" after a while.
   void State(const httplib::Request& req, httplib::Response& res) {
     std::unique_lock<std::mutex> lock(mutex_);
@@ -251,10 +275,14 @@ class Server {
         return;
       }
     }
-    json state = LayoutJson(session_.DatabasePath());
+    AppIndex apps;
+    json state = LayoutJson(session_.DatabasePath(), apps);
     state["version"] = version_;
     state["started"] = korrin::DataManager().m_db != NULL;
-    state["views"] = ComputedViewsJson();
+    // Only the view the page shows: each is as large as the home screen.
+    if (req.has_param("view")) {
+      state["view"] = ComputedViewJson(apps, req.get_param_value("view"));
+    }
     state["apps"] = AppsJson();
     state["log"] = LogJson();
     state["changes"] = changes_;

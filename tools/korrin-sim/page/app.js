@@ -28,11 +28,18 @@ async function run(line) {
   return response.ok;
 }
 
+// The state now, for the view just chosen; the long poll goes on alongside.
+async function refresh() {
+  const response = await fetch('/api/state?view=' + view);
+  state = await response.json();
+  render();
+}
+
 async function poll() {
   for (;;) {
     try {
-      const since = state ? '?since=' + state.version : '';
-      const response = await fetch('/api/state' + since);
+      const since = state ? '&since=' + state.version : '';
+      const response = await fetch('/api/state?view=' + view + since);
       const next = await response.json();
       if (!next.unchanged) {
         state = next;
@@ -74,21 +81,23 @@ function boxHtml(box, offGrid, editable) {
   const classes = ['box'];
   if (box.folder) classes.push('folder');
   if (box.shortcut) classes.push('shortcut');
-  if (!box.icon) classes.push('no-icon');
+  if (box.noIcon) classes.push('no-icon');
   if (box.disabled) classes.push('disabled');
   if (box.deactivated) classes.push('deactivated');
   if (offGrid) classes.push('off-grid');
   const icon = box.folder ? folderIcon(box) : initials(box.label);
   const drag = editable ? ' draggable="true"' : '';
   const del = editable && box.shortcut ? '<button class="delete" title="delete shortcut">×</button>' : '';
-  return `<div class="${classes.join(' ')}" data-id="${box.id}"${drag} title="#${box.id} ${escape(box.appId)}">` +
-      `<span class="icon" style="background:hsl(${hue(box.appId || box.label)},55%,45%)">${icon}</span>` +
+  const appId = box.appId || '';
+  return `<div class="${classes.join(' ')}" data-id="${box.id}"${drag} title="#${box.id} ${escape(appId)}">` +
+      `<span class="icon" style="background:hsl(${hue(appId || box.label)},55%,45%)">${icon}</span>` +
       `<span class="label">${escape(box.label)}</span>${del}</div>`;
 }
 
 // One page as a grid of |columns|: every cell, a box or empty, so that a box
 // can be dropped anywhere; boxes outside the grid or on a taken cell below it.
-function pageHtml(page, columns, editable) {
+// Returned as blocks of HTML, so that a long page can be drawn a part at a time.
+function pageBlocks(page, columns, editable) {
   const cells = new Map();
   const off = [];
   let rows = 1;
@@ -102,36 +111,65 @@ function pageHtml(page, columns, editable) {
     }
   }
   if (editable) rows += 1;  // a free row to drop into
-  const html = [`<div class="grid${columns === 3 ? ' folder-grid' : ''}">`];
-  for (let row = 1; row <= rows; ++row) {
-    for (let col = 1; col <= columns; ++col) {
-      const box = cells.get(row + ':' + col);
-      html.push(`<div class="cell" data-page="${page.id}" data-col="${col}" data-row="${row}">` +
-                (box ? boxHtml(box, false, editable) : '') + '</div>');
+  // Rows in blocks of 16, each a grid the browser may skip drawing while it
+  // is off screen: a menu of 10,000 boxes scrolls without stalling.
+  const html = [];
+  for (let first = 1; first <= rows; first += 16) {
+    const block = [`<div class="grid${columns === 3 ? ' folder-grid' : ''}">`];
+    for (let row = first; row <= Math.min(rows, first + 15); ++row) {
+      for (let col = 1; col <= columns; ++col) {
+        const box = cells.get(row + ':' + col);
+        block.push(`<div class="cell" data-page="${page.id}" data-col="${col}" data-row="${row}">` +
+                   (box ? boxHtml(box, false, editable) : '') + '</div>');
+      }
     }
+    block.push('</div>');
+    html.push(block.join(''));
   }
-  html.push('</div>');
   if (off.length) {
-    html.push('<div class="off-grid-list"><div class="page-title">off the grid</div><div class="grid">');
-    for (const box of off) html.push(`<div class="cell">${boxHtml(box, true, editable)}</div>`);
-    html.push('</div></div>');
+    html.push('<div class="off-grid-list"><div class="page-title">off the grid</div><div class="grid">' +
+              off.map(box => `<div class="cell">${boxHtml(box, true, editable)}</div>`).join('') +
+              '</div></div>');
   }
-  return html.join('');
+  return html;
+}
+
+function pageHtml(page, columns, editable) {
+  return pageBlocks(page, columns, editable).join('');
 }
 
 function pagesOfView() {
   if (view === 'home') return state.menus.flatMap(m => m.pages.map(p => ({...p, title: `${m.name} · page ${p.no}`})));
-  const pages = (state.views[view] || []);
+  const pages = state.view || [];
   return pages.map(p => ({...p, title: `${view} · page ${p.no} (#${p.id})`}));
+}
+
+// The first screenful at once, the rest of a long page in later tasks, so
+// that the first paint does not wait for ten thousand boxes. A newer drawing
+// stops an older one.
+let drawing = 0;
+function drawScreen(blocks) {
+  const mine = ++drawing;
+  const scroll = screen.scrollTop;
+  screen.innerHTML = blocks.slice(0, 8).join('');
+  screen.scrollTop = scroll;
+  let next = 8;
+  (function more() {
+    if (mine !== drawing || next >= blocks.length) return;
+    screen.insertAdjacentHTML('beforeend', blocks.slice(next, next + 40).join(''));
+    next += 40;
+    screen.scrollTop = scroll;
+    setTimeout(more, 0);
+  })();
 }
 
 function render() {
   const pages = pagesOfView();
   pageIndex = Math.min(pageIndex, Math.max(0, pages.length - 1));
   const page = pages[pageIndex];
-  screen.innerHTML = !state.started && view !== 'home' ? '<p class="page-title">start the engine to see its views</p>'
-      : page ? `<div class="page-title">${escape(page.title)}</div>` + pageHtml(page, 4, view === 'home')
-      : '<p class="page-title">no pages</p>';
+  drawScreen(!state.started && view !== 'home' ? ['<p class="page-title">start the engine to see its views</p>']
+      : page ? [`<div class="page-title">${escape(page.title)}</div>`, ...pageBlocks(page, 4, view === 'home')]
+      : ['<p class="page-title">no pages</p>']);
   dots.innerHTML = pages.length > 1 ? pages.map((p, i) =>
       `<button class="${i === pageIndex ? 'current' : ''}" data-index="${i}" title="${escape(p.title)}"></button>`).join('') : '';
   if (openFolder !== null) showFolder(openFolder);
@@ -219,6 +257,8 @@ document.getElementById('tabs').addEventListener('click', e => {
   if (!e.target.dataset.view) return;
   view = e.target.dataset.view;
   pageIndex = 0;
+  state.view = null;
+  refresh();
   for (const tab of document.querySelectorAll('#tabs button')) tab.setAttribute('aria-selected', tab === e.target);
   render();
 });
