@@ -23,7 +23,7 @@ cd "$(dirname "$0")/.."
 # The library needs SQLite and Boost's headers; korrin-sim adds
 # Boost.Program_options, libedit and dtl; the tests GoogleTest and GoogleMock.
 packages=(g++ make cmake pkg-config libsqlite3-dev libboost-dev libboost-program-options-dev
-          libedit-dev libdtl-dev libgtest-dev libgmock-dev)
+          libedit-dev libdtl-dev libgtest-dev libgmock-dev libcpp-httplib-dev nlohmann-json3-dev)
 
 install_missing_packages() {
   local missing=() p
@@ -104,6 +104,15 @@ prepare_arm_sysroot() {
   echo "$made_from" >"$sysroot/.made-from"
 }
 
+# The browser tests drive Debian's chromium with playwright-core from npm,
+# pinned by tests/serve/package-lock.json; npm itself from Debian when the
+# machine has none.
+install_browser_driver() {
+  command -v npm >/dev/null || install_missing_packages nodejs npm
+  [ -d tests/serve/node_modules/playwright-core ] ||
+    npm ci --prefix tests/serve --no-audit --no-fund >/dev/null
+}
+
 case "${1:-}" in
   demo)
     install_missing_packages
@@ -119,7 +128,8 @@ case "${1:-}" in
     exec build/tools/korrin-sim/korrin-sim demo
     ;;
   test)
-    install_missing_packages "${fuzz_packages[@]}" rpm
+    install_missing_packages "${fuzz_packages[@]}" rpm chromium
+    install_browser_driver
     build build
     run_tests build
     bash packaging/check-spec.sh

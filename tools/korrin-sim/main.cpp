@@ -136,9 +136,16 @@ bool ReadLine(const char* prompt, std::string& line) {
 }
 
 int Serve(DeviceRoot root, const korrin_sim::ServeOptions& options) {
+#ifdef KORRIN_SIM_SERVE
   if (!UseDeviceRoot(root)) return 1;
   korrin_sim::Session session;
   return Leave(root, korrin_sim::Serve(session, options));
+#else
+  (void)root;
+  (void)options;
+  std::cerr << "korrin-sim: this build has no `serve` (it was built without cpp-httplib)\n";
+  return 2;
+#endif
 }
 
 int Shell(DeviceRoot root) {
