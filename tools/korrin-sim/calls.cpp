@@ -25,6 +25,7 @@
 #include "korrin-data/korrin-data.h"
 #include "log-client-manager/log-client-manager.h"
 #include "system-info/system-info.h"
+#include "words.h"
 
 namespace korrin_sim {
 
@@ -130,6 +131,23 @@ void SetField(const RecordType<R>& type, const std::string& word, R& record) {
   throw UsageError("'" + name + "' is not a member of " + type.name);
 }
 
+// The stored record of that id; throws UsageError when there is none.
+GameViewData Stored(const RecordType<GameViewData>&, int id) {
+  boost::shared_ptr<GameViewData> menu = Instance<Store_>().GetMenuData(id);
+  if (!menu || menu->menuId != id) throw UsageError("no menu " + std::to_string(id) + " stored");
+  return *menu;
+}
+GamePageData Stored(const RecordType<GamePageData>&, int id) {
+  boost::shared_ptr<GamePageData> page = Instance<Store_>().GetMenuPageData(id);
+  if (!page || page->pageId != id) throw UsageError("no page " + std::to_string(id) + " stored");
+  return *page;
+}
+GameBoxData Stored(const RecordType<GameBoxData>&, int id) {
+  boost::shared_ptr<GameBoxData> box = Instance<Store_>().GetMenuBoxData(id);
+  if (!box || box->boxId != id) throw UsageError("no box " + std::to_string(id) + " stored");
+  return *box;
+}
+
 // ---- Enumerations by name: each name stands for its position, which is its
 // value on the platform (and in the tracker's job types).
 
@@ -172,9 +190,16 @@ class CallArgs {
     return ParseNamed(word, names, Name(), orInteger);
   }
   // The remaining words, as a record of FIELD=VALUE words or as a list.
+  // A first word TAG:ID (box:12) starts from the stored record, so that the
+  // fields not given keep their stored values.
   template <class R>
   R Record(const RecordType<R>& type) {
     R record;
+    std::string stored = std::string(type.tag) + ":";
+    if (More() && m_words[m_next].compare(0, stored.size(), stored) == 0) {
+      const std::string& word = m_words[m_next++];
+      record = Stored(type, ParseInt(word.substr(stored.size()), word));
+    }
     while (More()) SetField(type, m_words[m_next++], record);
     return record;
   }
@@ -669,7 +694,12 @@ std::vector<const Operation*> Find(const std::string& name) {
       found.push_back(&candidate);
     }
   }
-  if (found.empty()) throw UsageError("no operation " + name + " (call --list shows them)");
+  if (found.empty()) {
+    std::vector<std::string> names;
+    for (const Operation& known : kOperations) names.push_back(known.name);
+    std::string hint = DidYouMean(op, names);
+    throw UsageError("no operation " + name + (hint.empty() ? " (call --list shows them)" : hint));
+  }
   return found;
 }
 
@@ -690,7 +720,8 @@ void PrintWrapped(const std::string& text, std::ostream& out) {
 template <class R>
 void PrintRecordHelp(const char* placeholder, const RecordType<R>& type, std::ostream& out) {
   std::string text = std::string("FIELD=VALUE words setting members of ") + type.name +
-                     "; the others keep a new record's values. FIELD:";
+                     "; the others keep a new record's values, or the stored ones after a "
+                     "first word " + type.tag + ":ID. FIELD:";
   for (const Field<R>& field : type.fields) text += std::string(" ") + field.name;
   out << placeholder << "\n";
   PrintWrapped(text, out);
@@ -722,12 +753,20 @@ void Call(const std::vector<std::string>& words, std::ostream& out) {
     }
   }
   CallArgs args(words, op->args);
+  // A store's insert prints the new id first: it becomes `$last`.
+  bool insert = op->cls == kStore && std::string(op->name).compare(0, 6, "Insert") == 0;
+  std::stringstream result;
   try {
-    op->run(args, out);
+    op->run(args, insert ? result : out);
+    if (insert) {
+      out << result.str();
+      int id = 0;
+      if (result >> id && id > 0) ReturnId(id);
+    }
   } catch (const UsageError& e) {
     throw UsageError(words[0] + ": " + e.what() + "; usage: call " + Signature(*op));
   } catch (const std::exception& e) {
-    out << "exception: " << e.what() << "\n";
+    out << result.str() << "exception: " << e.what() << "\n";
   }
 }
 

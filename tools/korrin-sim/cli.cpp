@@ -6,6 +6,7 @@
 
 #include <iostream>
 #include <limits>
+#include <utility>
 
 namespace korrin_sim {
 
@@ -33,6 +34,21 @@ std::ostream& Out() { return *g_out; }
 
 void SetOut(std::ostream* out) { g_out = out != NULL ? out : &std::cout; }
 
+namespace {
+bool g_returned = false;
+int g_returnedId = 0;
+}  // namespace
+
+void ReturnId(int id) {
+  g_returned = true;
+  g_returnedId = id;
+}
+
+bool TakeReturnedId(int* id) {
+  if (g_returned && id != NULL) *id = g_returnedId;
+  return std::exchange(g_returned, false);
+}
+
 int ParseInt(const std::string& text, const std::string& what) {
   return static_cast<int>(ParseRange(text, what, std::numeric_limits<int>::min(),
                                      std::numeric_limits<int>::max()));
@@ -59,13 +75,13 @@ int ParseNamed(const std::string& text, const std::vector<std::string>& names,
   std::string all;
   for (size_t i = 0; i < names.size(); ++i) {
     if (text == names[i]) return static_cast<int>(i);
-    all += (i > 0 ? "|" : "") + names[i];
+    all += (i > 0 ? ", " : "") + names[i];
   }
-  if (!numbers) throw UsageError(what + ": '" + text + "' is not " + all);
+  if (!numbers) throw UsageError(what + ": '" + text + "' is not one of: " + all);
   try {
     return ParseInt(text, what);
   } catch (const UsageError&) {
-    throw UsageError(what + ": '" + text + "' is not " + all + " or a number");
+    throw UsageError(what + ": '" + text + "' is not a number or one of: " + all);
   }
 }
 

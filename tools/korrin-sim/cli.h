@@ -23,6 +23,11 @@ std::ostream& Out();
 // Points Out() at |out| (null: standard output).
 void SetOut(std::ostream* out);
 
+// The id a command hands back (an insert's new id), for `$last` and `let`:
+// ReturnId records it, TakeReturnedId takes it (false when none was handed).
+void ReturnId(int id);
+bool TakeReturnedId(int* id);
+
 // Values as scripts write them. Each throws UsageError naming |what| (the
 // argument's name) when |text| is not such a value.
 int ParseInt(const std::string& text, const std::string& what);

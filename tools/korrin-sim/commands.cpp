@@ -12,6 +12,7 @@
 #include "session.h"
 #include "sim/device.h"
 #include "views.h"
+#include "words.h"
 
 namespace po = boost::program_options;
 
@@ -155,7 +156,8 @@ std::vector<sim::App>::iterator FindApp(sim::Package& pkg, const std::string& ap
 
 void RunGame(Session&, const Args& args) {
   sim::Package pkg = sim::MakePackage(
-      args.Text("APPID"), {sim::GameApp(args.Text("APPID"), args.Text("LABEL"))});
+      args.Text("APPID"),
+      {sim::GameApp(args.Text("APPID"), args.Text(args.Has("LABEL") ? "LABEL" : "APPID"))});
   ApplyAppOptions(args, pkg.apps[0]);
   ApplyPackageOptions(args, pkg);
   Dev().AddPackage(pkg);
@@ -238,9 +240,22 @@ void RunEvent(Session&, const Args& args) {
                          args.Get<int>("progress"), args.Get<int>("error"));
 }
 
+// What `start` did, for `boot-done` and `card` to tell and follow.
+bool g_started = false;
+bool g_watchingCard = false;       // the launcher's watch on the card status
+int g_subscriptionsAtStart = -1;  // e_dbus_signal_handler_add calls; -1 when start subscribed
+
 void RunBootDone(Session&, const Args&) {
   int handlers = Dev().SendBootDone();
-  Out() << "BootingDone reached " << handlers << (handlers == 1 ? " handler\n" : " handlers\n");
+  Out() << "BootingDone reached " << handlers << (handlers == 1 ? " handler" : " handlers");
+  if (handlers == 0 && !g_started) {
+    Out() << ": the engine is not started (`start` subscribes)";
+  } else if (handlers == 0 &&
+             Dev().CallCount("e_dbus_signal_handler_add") == g_subscriptionsAtStart) {
+    Out() << ": `start --without boot-signal` left the subscription out "
+             "(`call _RegisterEdbusSignalHandler` makes it)";
+  }
+  Out() << "\n";
 }
 
 void RunPreference(Session&, const Args& args) {
@@ -252,7 +267,9 @@ void RunPreference(Session&, const Args& args) {
 }
 
 void RunCard(Session&, const Args& args) {
-  Dev().SetStorageCard(ParseNamed(args.Text("in|out"), {"out", "in"}, "in|out") != 0);
+  bool inserted = ParseNamed(args.Text("in|out"), {"in", "out"}, "card") == 0;
+  Dev().SetStorageCard(inserted);
+  if (g_watchingCard) korrin::PackageManager().OnMMCStatusChanged(inserted ? 1 : 0);
 }
 
 void RunScreen(Session&, const Args& args) {
@@ -263,8 +280,8 @@ void RunScreen(Session&, const Args& args) {
 }
 
 void RunMdm(Session&, const Args& args) {
-  bool reachable = ParseNamed(args.Text("reachable|unreachable"), {"unreachable", "reachable"},
-                              "reachable|unreachable");
+  bool reachable =
+      ParseNamed(args.Text("reachable|unreachable"), {"unreachable", "reachable"}, "mdm");
   std::map<std::string, mdm_status_t> states;
   for (const std::string& pair : args.List("APPID=STATE")) {
     size_t equals = pair.find('=');
@@ -284,7 +301,7 @@ void RunFail(Session&, const Args& args) {
   std::string call = args.Text("CALL");
   int error = ParseInt(args.Text("ERROR"), "ERROR");
   std::string how = args.Has("once|always") ? args.Text("once|always") : "once";
-  bool always = ParseNamed(how, {"once", "always"}, "once|always") != 0;
+  bool always = ParseNamed(how, {"once", "always"}, "fail") != 0;
   try {
     if (always) {
       Dev().FailAlways(call, error);
@@ -296,7 +313,25 @@ void RunFail(Session&, const Args& args) {
   }
 }
 
-void RunStart(Session&, const Args&) { data_engin_initialization(); }
+// The steps of the launcher's start-up after the engine's own, by name.
+const std::vector<std::string> kStartSteps = {"boot-signal", "card-watch"};
+
+void RunStart(Session&, const Args& args) {
+  std::vector<std::string> without = args.List("without");
+  for (const std::string& step : without) ParseNamed(step, kStartSteps, "--without");
+  auto wanted = [&](const char* step) {
+    return std::find(without.begin(), without.end(), step) == without.end();
+  };
+  data_engin_initialization();
+  g_started = true;
+  g_subscriptionsAtStart = -1;
+  if (wanted("boot-signal") && !korrin::PackageManager()._RegisterEdbusSignalHandler()) {
+    Out() << "boot-signal: the subscription failed (`log` says why)\n";
+  } else if (!wanted("boot-signal")) {
+    g_subscriptionsAtStart = Dev().CallCount("e_dbus_signal_handler_add");
+  }
+  g_watchingCard = wanted("card-watch");
+}
 
 void RunStop(Session&, const Args&) { data_engin_uninitialization(); }
 
@@ -349,7 +384,7 @@ void RunCount(Session&, const Args& args) {
 
 void RunTrace(Session& session, const Args& args) {
   if (args.Has("on|off")) {
-    session.Trace(ParseNamed(args.Text("on|off"), {"off", "on"}, "on|off") != 0);
+    session.Trace(ParseNamed(args.Text("on|off"), {"off", "on"}, "trace") != 0);
   } else {
     for (const std::string& sql : session.TakeStatements()) Out() << sql << "\n";
   }
@@ -431,9 +466,9 @@ std::vector<Command> MakeCommands() {
        "Adds the sample device's packages (a few dozen games, other applications, a\n"
        "no-display service, a deactivated package), a 720x1280 screen, no card.",
        "sample-device", kAction, kParsed, NoOptions, RunSampleDevice},
-      {"game", "APPID LABEL", "add a game package to the device (no event)",
-       "Installs, silently, a package APPID holding one game APPID labelled LABEL.\n"
-       "Options change its properties.",
+      {"game", "APPID [LABEL]", "add a game package to the device (no event)",
+       "Installs, silently, a package APPID holding one game APPID labelled LABEL\n"
+       "(or APPID). Options change its properties (--label too).",
        "game com.acme.tetra \"Tetra Blocks\" --preload", kAction, kParsed, AddBothOptions,
        RunGame},
       {"package", "PKGID", "add or change a package (no event)",
@@ -459,7 +494,9 @@ std::vector<Command> MakeCommands() {
        "Sets preference KEY to the integer VALUE; without VALUE removes it.",
        "preference memory/sysman/mmc 1", kAction, kParsed, NoOptions, RunPreference},
       {"card", "in|out", "insert or pull the storage card",
-       "Sets the storage-card status (preference memory/sysman/mmc): 1 in, 0 out.",
+       "Sets the storage-card status (preference memory/sysman/mmc): 1 in, 0 out.\n"
+       "After `start` (unless --without card-watch) the launcher sees the change and\n"
+       "calls OnMMCStatusChanged with it.",
        "card out", kAction, kParsed, NoOptions,
        RunCard},
       {"screen", "WIDTH HEIGHT", "set the screen size",
@@ -521,13 +558,26 @@ std::vector<Command> MakeCommands() {
        },
        RunEvent},
       {"boot-done", "", "send the BootingDone signal on the system bus",
-       "Sends deviced's BootingDone signal and says how many handlers it reached.",
+       "Sends deviced's BootingDone signal and says how many handlers it reached;\n"
+       "`start` subscribes the engine, for the first signal only. Reaching none\n"
+       "before `start` or after `start --without boot-signal`, it says so.",
        "boot-done", kAction, kParsed, NoOptions, RunBootDone},
       // ---- The engine.
-      {"start", "", "start the engine: data_engin_initialization()",
-       "Calls data_engin_initialization() as the launcher does at start-up: the first\n"
-       "launch lays every game out in menu 1 \"Apps\".",
-       "start", kAction, kParsed, NoOptions, RunStart},
+      {"start", "", "the launcher start-up: engine, boot signal, card",
+       "Does what the launcher application does at start-up:\n"
+       "  engine       data_engin_initialization(): the first launch lays every game\n"
+       "               out in menu 1 \"Apps\"\n"
+       "  boot-signal  _RegisterEdbusSignalHandler(): `boot-done` reaches the engine,\n"
+       "               which then looks up again the applications on the card\n"
+       "  card-watch   the launcher watches the card status: `card in|out` calls\n"
+       "               OnMMCStatusChanged(1|0)\n"
+       "--without STEP leaves boot-signal or card-watch out, to make it by hand.",
+       "start\nstart --without boot-signal --without card-watch", kAction, kParsed,
+       [](po::options_description& o) {
+         o.add_options()("without", po::value<std::vector<std::string> >()->value_name("STEP"),
+                         "leave boot-signal or card-watch out (repeat for both)");
+       },
+       RunStart},
       {"stop", "", "data_engin_uninitialization()",
        "Calls data_engin_uninitialization(), which does nothing: the managers live\n"
        "until the process ends.",
@@ -575,7 +625,13 @@ std::vector<Command> MakeCommands() {
       {"log", "", "show the platform log",
        "Shows the log lines the last command that changed something wrote (--all:\n"
        "every line), as P/tag: text, a newline in a text as \\n. --message leaves out\n"
-       "the \"file: function(line) >  \" prefix.",
+       "the \"file: function(line) >  \" prefix.\n"
+       "After each command, korrin-sim says on stderr how many failures the engine\n"
+       "logged. The engine logs much information at error priority (E/), so only E/\n"
+       "lines that say something went wrong count: \"error\", \"fail\", \"cannot\",\n"
+       "\"invalid\", \"Err :\", \"return [\", \"No page [\", \"No box [\"; not a call that\n"
+       "said no with code 0 (\"FAILED [0]\") nor the look-up for an existing box that\n"
+       "every install makes (\"cannot find box with appid\").",
        "log --priority E --grep \"Do not add\"", kView, kParsed,
        [](po::options_description& o) {
          o.add_options()("priority", po::value<std::string>()->value_name("V|D|I|W|E|F"),
@@ -619,6 +675,12 @@ const std::vector<Command>& Topics() {
        "count. A difference stops the script with a diff.",
        "layout\nexpect\nmenu 1 \"Apps\"\npage 1\n 1 | Tetra Blocks\nend", false,
        Command::kOptions, NoOptions, nullptr},
+      {"quoting", "", "quotes and backslashes: how words split", kQuotingHelp,
+       "install com.acme.c \"Don't Starve\" --preload\n"
+       "game com.acme.o 'O'\\''Brien \"the\" Racer'\n"
+       "call InsertMenuData name=$'two\\nlines' type=0\n"
+       "game com.acme.x --label \"\"",
+       false, Command::kOptions, NoOptions, nullptr},
   };
   return topics;
 }
@@ -656,6 +718,7 @@ const std::vector<Command>& Commands() {
   static const std::vector<Command> commands = [] {
     std::vector<Command> all = MakeCommands();
     for (Command& c : DeviceCommands()) all.push_back(c);
+    for (Command& c : LayoutCommands()) all.push_back(c);
     return all;
   }();
   return commands;
@@ -671,14 +734,16 @@ po::options_description VisibleOptions(const Command& command) {
 
 void PrintCommandList(std::ostream& out) {
   out << "usage: korrin-sim [demo] [--root DIR | --keep]\n"
-         "       korrin-sim run [--root DIR | --keep] FILE...\n"
+         "       korrin-sim run [--root DIR | --keep] FILE...    (FILE - is standard input)\n"
          "       korrin-sim shell [--root DIR | --keep]\n"
-         "       korrin-sim help [COMMAND]\n\n"
+         "       korrin-sim help [COMMAND]\n"
+         "       korrin-sim --version\n\n"
          "Without --root, the device lives in a fresh folder under $TMPDIR (/tmp),\n"
          "removed at exit unless --keep (or a failed `run`, which says so). A kept\n"
          "root keeps the phone in ROOT/device.ksim beside its database, and the next\n"
          "run on that root starts with both.\n"
-         "Scripts hold one command per line; # starts a comment line.\n\n"
+         "Scripts hold one command per line; # starts a comment line. Words split\n"
+         "as in the POSIX shell, nothing expanded: `help quoting`.\n\n"
          "commands:\n";
   for (const Command& command : Commands()) PrintSummary(command, out);
   for (const Command& topic : Topics()) PrintSummary(topic, out);
@@ -700,10 +765,18 @@ void PrintCommandList(std::ostream& out) {
 void PrintCommandHelp(const std::string& name, std::ostream& out) {
   const Command* command = FindCommand(name);
   if (command == NULL) command = Named(Topics(), name);
-  if (command == NULL) throw UsageError("no command '" + name + "' (`help` lists them)");
-  out << "usage: " << command->name << (command->args.empty() ? "" : " " + command->args)
-      << "\n\n"
-      << command->details << "\n";
+  if (command == NULL) {
+    std::vector<std::string> names;
+    for (const Command& known : Commands()) names.push_back(known.name);
+    for (const Command& topic : Topics()) names.push_back(topic.name);
+    std::string hint = DidYouMean(name, names);
+    throw UsageError("no command '" + name + "'" + (hint.empty() ? " (`help` lists them)" : hint));
+  }
+  if (command->name != "quoting") {  // a topic, not a line to write
+    out << "usage: " << command->name << (command->args.empty() ? "" : " " + command->args)
+        << "\n\n";
+  }
+  out << command->details << "\n";
   po::options_description options = VisibleOptions(*command);
   if (!options.options().empty()) out << "\n" << options;
   if (command->name == "call") {

@@ -57,6 +57,8 @@ struct Command {
 
 // `save` and `load` (device-state.cpp).
 std::vector<Command> DeviceCommands();
+// make-folder, move, rename, remove-box and let (layout-verbs.cpp).
+std::vector<Command> LayoutCommands();
 
 const std::vector<Command>& Commands();
 // The command, or null.

@@ -14,6 +14,7 @@
 #include "commands.h"
 #include "session.h"
 #include "sim/device.h"
+#include "words.h"
 
 namespace korrin_sim {
 
@@ -29,21 +30,8 @@ const std::vector<std::string> kDeviceCommands = {"sample-device", "game", "pack
                                                   "remove", "preference", "card", "screen",
                                                   "mdm"};
 
-// |text| as one word of a command line: bare when plain, else in double
-// quotes with the escapes the line splitter reads back (\\ \" \' \n).
-std::string Word(const std::string& text) {
-  bool plain = !text.empty() && text[0] != '-' &&
-               std::all_of(text.begin(), text.end(), [](char c) {
-                 return isalnum(static_cast<unsigned char>(c)) || strchr("._/:@%+,=~-", c);
-               });
-  if (plain) return text;
-  std::string out = "\"";
-  for (char c : text) {
-    if (c == '\\' || c == '"' || c == '\'') out += '\\';
-    out += c == '\n' ? std::string("\\n") : std::string(1, c);
-  }
-  return out + "\"";
-}
+// |text| as one word of a command line that reads back as written.
+std::string Word(const std::string& text) { return ShellWord(text); }
 
 // " --name=VALUE": with '=', a value that starts with "--" stays a value.
 std::string Option(const std::string& name, const std::string& value) {

@@ -17,6 +17,7 @@
 
 #include <boost/program_options.hpp>
 
+#include "calls.h"
 #include "cli.h"
 #include "demo-story.h"
 #include "demo.h"
@@ -24,6 +25,7 @@
 #include "serve.h"
 #include "session.h"
 #include "sim/device.h"
+#include "words.h"
 
 namespace po = boost::program_options;
 
@@ -105,21 +107,31 @@ int Demo(DeviceRoot root) {
 
 int Run(DeviceRoot root, const std::vector<std::string>& files) {
   if (files.empty()) {
-    std::cerr << "korrin-sim: run what? usage: korrin-sim run [--root DIR] FILE...\n";
+    std::cerr << "korrin-sim: run what? usage: korrin-sim run [--root DIR] FILE... (-: stdin)\n";
     return 2;
   }
   for (const std::string& file : files) {
+    if (file == "-") continue;  // standard input
     if (!std::ifstream(file)) {
       std::cerr << "korrin-sim: cannot read " << file << ": " << strerror(errno) << "\n";
+      return 1;
+    }
+    // A folder opens, and reads as nothing: say so rather than play nothing.
+    if (!std::filesystem::is_regular_file(file)) {
+      std::cerr << "korrin-sim: cannot read " << file << ": not a regular file\n";
       return 1;
     }
   }
   if (!UseDeviceRoot(root)) return 1;
   korrin_sim::Session session;
   for (const std::string& file : files) {
-    std::ifstream in(file);
+    std::ifstream opened;
+    if (file != "-") opened.open(file);
+    std::istream& in = file == "-" ? std::cin : opened;
     // A failed script keeps its temporary root, to be looked into.
-    if (!session.RunScript(in, file, std::cerr)) return Leave(root, 1, /*inspect=*/true);
+    if (!session.RunScript(in, file == "-" ? "stdin" : file, std::cerr)) {
+      return Leave(root, 1, /*inspect=*/true);
+    }
   }
   return Leave(root, 0);
 }
@@ -177,9 +189,37 @@ int Shell(DeviceRoot root) {
   return Leave(root, 0);
 }
 
+// `korrin-sim help WORD...`, read before the options: `help call --list` is
+// a command's own words.
+int Help(const std::vector<std::string>& words) {
+  try {
+    if (words.empty()) {
+      korrin_sim::PrintCommandList(std::cout);
+    } else if (words.size() == 1) {
+      korrin_sim::PrintCommandHelp(words[0], std::cout);
+    } else if (words[0] == "call" && (words[1] == "--list" || words[1] == "--help")) {
+      korrin_sim::Call(std::vector<std::string>(words.begin() + 1, words.end()), std::cout);
+    } else {
+      std::cerr << "korrin-sim: help takes one COMMAND, or call --list / call --help NAME\n";
+      return 2;
+    }
+    return 0;
+  } catch (const korrin_sim::UsageError& e) {
+    std::cerr << "korrin-sim: " << e.what() << "\n";
+    return 2;
+  }
+}
+
 }  // namespace
 
 int main(int argc, char** argv) {
+  if (argc >= 2 && strcmp(argv[1], "help") == 0) {
+    return Help(std::vector<std::string>(argv + 2, argv + argc));
+  }
+  // korrin-sim counts the engine's failures after each command and keeps the
+  // log for `log`: it echoes the log only when KORRIN_SIM_LOG asks.
+  const char* echo = getenv("KORRIN_SIM_LOG");
+  if (echo == NULL || *echo == '\0') sim::Device::Get().EchoLogs(false);
   po::options_description visible("options");
   visible.add_options()("root", po::value<std::string>()->value_name("DIR"),
                         "keep the device (its phone and database) in DIR")(
@@ -187,7 +227,7 @@ int main(int argc, char** argv) {
       "port", po::value<int>()->default_value(8080)->value_name("N"),
       "serve: the port on 127.0.0.1 (0: any free one)")(
       "script", po::value<std::string>()->value_name("FILE"), "serve: play FILE first")(
-      "help", "list the commands");
+      "help", "list the commands")("version", "print korrin-sim's version and the library's");
   po::options_description all;
   all.add(visible).add_options()("mode", po::value<std::string>()->default_value("demo"))(
       "files", po::value<std::vector<std::string> >());
@@ -197,9 +237,18 @@ int main(int argc, char** argv) {
   try {
     po::store(po::command_line_parser(argc, argv).options(all).positional(order).run(), values);
     po::notify(values);
+  } catch (const po::unknown_option& e) {
+    std::cerr << "korrin-sim: unknown option '" << e.get_option_name() << "'"
+              << korrin_sim::DidYouMean(e.get_option_name(), {"--root", "--keep", "--port", "--script", "--help", "--version"})
+              << " (korrin-sim --help)\n";
+    return 2;
   } catch (const po::error& e) {
     std::cerr << "korrin-sim: " << e.what() << " (korrin-sim --help)\n";
     return 2;
+  }
+  if (values.count("version")) {
+    std::cout << "korrin-sim " KORRIN_VERSION " (korrin-data " KORRIN_VERSION ")\n";
+    return 0;
   }
   std::string mode = values["mode"].as<std::string>();
   DeviceRoot root{values.count("root") ? values["root"].as<std::string>() : "",
@@ -207,28 +256,25 @@ int main(int argc, char** argv) {
   std::vector<std::string> files =
       values.count("files") ? values["files"].as<std::vector<std::string> >()
                             : std::vector<std::string>();
-  if (values.count("help") || (mode == "help" && files.empty())) {
-    korrin_sim::PrintCommandList(std::cout);
-    return 0;
-  }
-  if (mode == "help" && files.size() == 1) {
-    try {
-      korrin_sim::PrintCommandHelp(files[0], std::cout);
-      return 0;
-    } catch (const korrin_sim::UsageError& e) {
-      std::cerr << "korrin-sim: " << e.what() << "\n";
-      return 2;
-    }
-  }
-  if (mode == "demo" && files.empty()) return Demo(root);
+  if (values.count("help")) return Help({});
+  if (mode == "help") return Help(files);
   if (mode == "run") return Run(root, files);
-  if (mode == "shell" && files.empty()) return Shell(root);
-  if (mode == "serve" && files.empty()) {
+  if (mode != "demo" && mode != "shell" && mode != "serve") {
+    std::cerr << "korrin-sim: unknown mode '" << mode << "'"
+              << korrin_sim::DidYouMean(mode, {"demo", "run", "shell", "serve", "help"})
+              << " (korrin-sim --help)\n";
+    return 2;
+  }
+  if (!files.empty()) {
+    std::cerr << "korrin-sim: " << mode << " takes no more words: '" << files[0]
+              << "' (korrin-sim --help)\n";
+    return 2;
+  }
+  if (mode == "serve") {
     korrin_sim::ServeOptions serve;
     serve.port = values["port"].as<int>();
     if (values.count("script")) serve.script = values["script"].as<std::string>();
     return Serve(root, serve);
   }
-  std::cerr << "korrin-sim: unknown mode or extra words (korrin-sim --help)\n";
-  return 2;
+  return mode == "demo" ? Demo(root) : Shell(root);
 }

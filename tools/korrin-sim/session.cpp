@@ -1,5 +1,8 @@
 #include "session.h"
 
+#include <ctype.h>
+#include <dlog.h>
+
 #include <algorithm>
 #include <iostream>
 #include <sstream>
@@ -14,6 +17,7 @@
 #include "commands.h"
 #include "common/device-path.h"
 #include "korrin-data/korrin-data.h"
+#include "words.h"
 
 namespace po = boost::program_options;
 
@@ -88,6 +92,15 @@ void Parse(const Command& command, const std::vector<std::string>& words,
     po::store(po::command_line_parser(words).options(all).positional(order).style(style).run(),
               values);
     po::notify(values);
+  } catch (const po::unknown_option& e) {
+    po::options_description visible = VisibleOptions(command);
+    std::vector<std::string> known;
+    for (const auto& option : visible.options()) {
+      known.push_back("--" + option->long_name());
+    }
+    std::string word = e.get_option_name();
+    throw UsageError(command.name + ": unknown option '" + word + "'" +
+                     DidYouMean(word.substr(0, word.find('=')), known));
   } catch (const po::error& e) {
     throw UsageError(command.name + ": " + e.what());
   }
@@ -96,14 +109,6 @@ void Parse(const Command& command, const std::vector<std::string>& words,
       throw UsageError(command.name + ": missing " + p.name + " (usage: " + command.name +
                        " " + command.args + ")");
     }
-  }
-}
-
-std::vector<std::string> SplitWords(const std::string& line) {
-  try {
-    return po::split_unix(line);
-  } catch (const std::exception& e) {
-    throw UsageError(std::string("cannot split the line into words: ") + e.what());
   }
 }
 
@@ -154,7 +159,68 @@ bool IsComment(const std::string& line) {
   return first != std::string::npos && line[first] == '#';
 }
 
+// Whether the engine wrote |line| as a failure. The engine logs much at error
+// priority that is only information ("#Step 1", "Name[...]", "appId[...]"), so
+// a line counts only when its message says that something went wrong.
+bool FailureLogged(const sim::LogLine& line) {
+  static const char* const kMarkers[] = {"error", "fail", "cannot", "invalid", "err :",
+                                         "return [", "no page [", "no box ["};
+  if (line.priority < DLOG_ERROR) return false;
+  size_t prefix = line.text.find(") >  ");
+  std::string text = line.text.substr(prefix == std::string::npos ? 0 : prefix + 5);
+  std::transform(text.begin(), text.end(), text.begin(),
+                 [](unsigned char c) { return std::tolower(c); });
+  // Information in a failure's words: a call that worked and said no (its
+  // code 0: "app_info_is_game FAILED [0] [0]" for an application that is no
+  // game), and the look-up every install makes before placing a new box.
+  static const char* const kNotFailures[] = {"failed [0]", "cannot find box with appid"};
+  for (const char* words : kNotFailures) {
+    if (text.find(words) != std::string::npos) return false;
+  }
+  for (const char* marker : kMarkers) {
+    if (text.find(marker) != std::string::npos) return true;
+  }
+  return false;
+}
+
+bool IsNameStart(char c) { return std::isalpha(static_cast<unsigned char>(c)) != 0; }
+bool IsNameChar(char c) { return std::isalnum(static_cast<unsigned char>(c)) != 0 || c == '_'; }
+
 }  // namespace
+
+void Session::Bind(const std::string& name, int id) {
+  CheckName(name);
+  names_[name] = id;
+}
+
+void Session::CheckName(const std::string& name) const {
+  if (name.empty() || !IsNameStart(name[0]) ||
+      !std::all_of(name.begin(), name.end(), IsNameChar)) {
+    throw UsageError("'" + name + "' is not a name: letters, digits and _, a letter first");
+  }
+  if (name == "last") throw UsageError("$last is the last insert's id; `let` another name");
+}
+
+std::string Session::Value(const std::string& name) const {
+  std::map<std::string, int>::const_iterator bound = names_.find(name);
+  if (bound == names_.end()) {
+    throw UsageError("$" + name + " is not bound" +
+                     (name == "last" ? ": nothing was inserted yet"
+                                     : ": `let " + name + " = COMMAND` binds it"));
+  }
+  return std::to_string(bound->second);
+}
+
+void Session::ReportFailures(size_t logMark, bool action) const {
+  const std::vector<sim::LogLine>& logs = sim::Device::Get().Logs();
+  size_t failures = 0;
+  for (size_t i = logMark; i < logs.size(); ++i) failures += FailureLogged(logs[i]);
+  if (failures == 0) return;
+  std::cout << std::flush;
+  std::cerr << where_ << failures << (failures == 1 ? " failure" : " failures")
+            << " logged by the engine (`log " << (action ? "" : "--all ")
+            << "--priority E` shows them)" << std::endl;
+}
 
 Session::Session(bool printActions, bool recordChanges)
     : printActions_(printActions), recordChanges_(recordChanges), tracing_(false), logMark_(0) {}
@@ -193,16 +259,24 @@ void Session::FollowStoreTrace() {
 
 std::string Session::DatabasePath() const { return korrin::DevicePath(korrin::kGameDataDbPath); }
 
-Session::Prepared Session::Prepare(const std::string& line) const {
+Session::Prepared Session::Prepare(const std::string& written) const {
   Prepared prepared;
+  const std::string& line = written;
   std::string name = line.substr(line.find_first_not_of(" \t"));
   name = name.substr(0, name.find_first_of(" \t"));
   prepared.command = FindCommand(name);
   if (prepared.command == NULL) {
-    throw UsageError("unknown command '" + name + "' (`help` lists the commands)");
+    std::vector<std::string> names;
+    for (const Command& command : Commands()) names.push_back(command.name);
+    std::string hint = DidYouMean(name, names);
+    throw UsageError("unknown command '" + name + "'" +
+                     (hint.empty() ? " (`help` lists the commands)" : hint));
   }
   prepared.rest = RestOfLine(line);
-  if (prepared.command->parsing != Command::kText) prepared.words = SplitWords(prepared.rest);
+  if (prepared.command->parsing != Command::kText) {
+    prepared.words =
+        SplitWords(prepared.rest, [this](const std::string& name) { return Value(name); });
+  }
   if (prepared.command->parsing == Command::kOptions) {
     Parse(*prepared.command, prepared.words, prepared.values);
   }
@@ -223,14 +297,21 @@ void Session::Execute(const std::string& line) {
   std::ostringstream output;
   SetOut(&output);
   FollowStoreTrace();
+  returned_.reset();
+  TakeReturnedId(NULL);  // one a failed command left
+  ++depth_;
   try {
     command.run(*this, Args(prepared.values, prepared.words, prepared.rest));
   } catch (...) {
+    --depth_;
     SetOut(&outer);
     beforeError_ = nullptr;  // the command's own error is the one to tell
     throw;
   }
+  --depth_;
   SetOut(&outer);
+  int id = 0;
+  if (TakeReturnedId(&id)) returned_ = names_["last"] = id;
   if (beforeError_) std::rethrow_exception(std::exchange(beforeError_, nullptr));
   lastOutput_ = output.str();
   if (command.action) {
@@ -243,6 +324,7 @@ void Session::Execute(const std::string& line) {
   } else if (printActions_ || !command.action) {
     std::cout << lastOutput_ << std::flush;
   }
+  if (depth_ == 0) ReportFailures(logMark, command.action);
 }
 
 void Session::RunBefore(const std::string& call, const std::string& line) {
@@ -312,10 +394,13 @@ bool Session::RunScript(std::istream& in, const std::string& file, std::ostream&
     while (std::getline(in, line)) {
       ++number;
       if (!block_) at = number;
+      where_ = file + ":" + std::to_string(number) + ": ";
       Feed(line);
     }
     Finish();
+    where_.clear();
   } catch (const std::exception& e) {
+    where_.clear();
     std::cout << std::flush;
     errors << file << ":" << at << ": " << e.what() << std::endl;
     return false;

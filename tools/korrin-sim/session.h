@@ -62,6 +62,17 @@ class Session {
   // when every line ran.
   bool RunScript(std::istream& in, const std::string& file, std::ostream& errors);
 
+  // ---- Named ids: `$last` and the names `let` binds, written $NAME.
+
+  // Binds $NAME to |id|. Throws UsageError for a NAME that is not a word of
+  // letters, digits and _ starting with a letter, or for "last".
+  void Bind(const std::string& name, int id);
+  void CheckName(const std::string& name) const;  // throws as Bind does
+  // The id the last command run handed back (an insert's), if it did.
+  std::optional<int> returned() const { return returned_; }
+  // The id bound to $|name|; throws UsageError naming it when unbound.
+  std::string Value(const std::string& name) const;
+
   // ---- For the commands.
 
   // Runs |line| when the engine next makes platform |call|; lines queued for
@@ -98,7 +109,15 @@ class Session {
   Session(const Session&) = delete;
   Session& operator=(const Session&) = delete;
 
+  // After a command at the outermost level: says on stderr how many failures
+  // the engine logged while it ran (see FailureLogged in session.cpp).
+  void ReportFailures(size_t logMark, bool action) const;
+
   bool printActions_;
+  std::map<std::string, int> names_;  // bound by `let`; "last" by any insert
+  std::optional<int> returned_;
+  int depth_ = 0;      // commands running, one inside another (`let`, `before`)
+  std::string where_;  // "FILE:LINE: " of the script line running, for reports
   bool recordChanges_;
   bool tracing_;
   std::vector<std::string> statements_;  // traced, not yet taken

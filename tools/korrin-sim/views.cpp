@@ -115,8 +115,21 @@ std::string TrimRight(std::string line) {
 void PrintStoredPage(const Reader& db, int64_t pageId, int columns, int indent, bool ids,
                      std::ostream& out);
 
+// The folders being drawn, outermost first: a folder whose page holds the
+// folder itself (or one around it) is named, not drawn again forever.
+std::vector<int64_t> g_openFolders;
+
 void PrintFolderPages(const Reader& db, int64_t boxId, const std::string& name, int indent,
                       bool ids, std::ostream& out) {
+  if (std::find(g_openFolders.begin(), g_openFolders.end(), boxId) != g_openFolders.end()) {
+    out << std::string(indent, ' ') << "folder " << Quote(name) << " (box " << boxId
+        << ") holds itself: shown above\n";
+    return;
+  }
+  g_openFolders.push_back(boxId);
+  struct Close {
+    ~Close() { g_openFolders.pop_back(); }
+  } close;
   std::vector<Row> pages = db.Rows(
       "SELECT pageId, pageNo FROM Pages WHERE isFolder = 1 AND parentId = ? ORDER BY pageNo",
       boxId);
@@ -188,18 +201,15 @@ void PrintGrid(const std::vector<GridBox>& boxes, int columns, int indent, std::
     out << pad << " (empty)\n";
     return;
   }
-  int rows = 0;
   std::map<std::pair<int, int>, std::string> cells;  // (row, col) -> label
   std::vector<const GridBox*> elsewhere;
   for (const GridBox& box : boxes) {
     bool onGrid = box.row >= 1 && box.col >= 1 && box.col <= columns;
-    if (onGrid && cells.emplace(std::make_pair(box.row, box.col), box.label).second) {
-      rows = std::max(rows, box.row);
-    } else {
+    if (!onGrid || !cells.emplace(std::make_pair(box.row, box.col), box.label).second) {
       elsewhere.push_back(&box);
     }
   }
-  for (int row = 1; row <= rows; ++row) {
+  auto drawRow = [&](int row) {
     std::string line = pad + (row < 10 ? " " : "") + std::to_string(row) + " ";
     int last = 0;
     for (int col = 1; col <= columns; ++col) {
@@ -211,6 +221,19 @@ void PrintGrid(const std::vector<GridBox>& boxes, int columns, int indent, std::
       line += "| " + Cell(cell != cells.end() ? cell->second : "", kCellWidth) + " ";
     }
     out << TrimRight(line) << "\n";
+  };
+  // Rows are drawn from 1 to the last one used; a long run of empty rows (a box
+  // far down, in row 2147483647 say) is one line.
+  const long long kEmptyRowsDrawn = 9;
+  long long drawn = 0;  // the last row drawn
+  for (std::map<std::pair<int, int>, std::string>::const_iterator used = cells.begin();
+       used != cells.end(); used = cells.upper_bound(std::make_pair(used->first.first, columns))) {
+    long long row = used->first.first;
+    if (row - 1 - drawn > kEmptyRowsDrawn) {
+      out << pad << "   (rows " << drawn + 1 << " to " << row - 1 << " empty)\n";
+      drawn = row - 1;
+    }
+    while (drawn < row) drawRow(static_cast<int>(++drawn));
   }
   for (const GridBox* box : elsewhere) {
     out << pad << "   also at row " << box->row << ", col " << box->col << ": " << box->label

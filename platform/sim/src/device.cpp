@@ -7,6 +7,7 @@
 #include <stdlib.h>
 #include <string.h>
 #include <sys/stat.h>
+#include <unistd.h>
 
 #include "state.h"
 
@@ -16,9 +17,13 @@ const char kLauncherDataDir[] = "/opt/usr/apps/com.velmora.korrin/data";
 
 namespace {
 
+// KORRIN_SIM_LOG=stderr echoes the log, any other value keeps it in; unset or
+// empty, a host at a terminal sees it, so that a failure never goes unsaid,
+// while tests (whose stderr is no terminal) see what they always saw.
 bool EchoRequestedByEnvironment() {
   const char* value = getenv("KORRIN_SIM_LOG");
-  return value != NULL && strcmp(value, "stderr") == 0;
+  if (value == NULL || *value == '\0') return isatty(STDERR_FILENO) == 1;
+  return strcmp(value, "stderr") == 0;
 }
 
 bool MakeDirs(const std::string& path) {

@@ -24,6 +24,7 @@
 #include "cli.h"
 #include "session.h"
 #include "sim/device.h"
+#include "words.h"
 
 namespace {
 
@@ -192,13 +193,7 @@ const char* const kLabels[] = {"Tide", "Ember", "Racer", "Chess", "Nova", "Orbit
                                "\xe6\xb8\xb8\xe6\x88\x8f"};
 
 // One word of a command line, quoted as korrin-sim splits it.
-std::string Arg(const std::string& text) {
-  const char kPlain[] = "ABCDEFGHIJKLMNOPQRSTUVWXYZabcdefghijklmnopqrstuvwxyz0123456789.=/?";
-  if (text.find_first_not_of(kPlain) == std::string::npos) return text;
-  std::string word = "\"";
-  for (char c : text) word += (c == '"' || c == '\'' || c == '\\' ? "\\" : "") + std::string(1, c);
-  return word + "\"";
-}
+std::string Arg(const std::string& text) { return korrin_sim::ShellWord(text); }
 
 std::string Flag(const char* name, bool was, bool now) {
   return was == now ? "" : std::string(" --") + name + (now ? "" : "=false");
@@ -264,7 +259,7 @@ class Generator {
           Emit("before app_info_filter_destroy install " + Arg(pkgId));
         }
         model.Start(pkg.id.empty() ? NULL : &pkg);
-        return Emit("start");
+        return Emit("start --without boot-signal --without card-watch");  // BootDone subscribes
       case 8: return BootDone(model);
       case 9: return Emit("call InsertPageData parentId=1 pageNo=" + std::to_string(++model.pages));
     }

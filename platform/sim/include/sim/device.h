@@ -192,8 +192,9 @@ class Device {
   // Every dlog line since the last Reset or ClearLogs, oldest first.
   const std::vector<LogLine>& Logs() const;
   void ClearLogs();
-  // Also print each new line to stderr as "P/tag(pid): text". On by default
-  // when the environment sets KORRIN_SIM_LOG=stderr.
+  // Also print each new line to stderr as "P/tag(pid): text". By default on
+  // when the environment sets KORRIN_SIM_LOG=stderr, off when it sets another
+  // value, and, unset or empty, on when stderr is a terminal.
   void EchoLogs(bool on);
   // Every record sent through the usage-log client since the last Reset.
   const std::vector<UsageLog>& UsageLogs() const;
