@@ -197,7 +197,9 @@ json LogJson() {
     PrintLogLine(logs[i], /*messageOnly=*/true, line);
     std::string text = line.str();
     if (!text.empty() && text.back() == '\n') text.pop_back();
-    lines.push_back({{"priority", logs[i].priority}, {"text", text}});
+    json entry = {{"priority", logs[i].priority}, {"text", text}};
+    if (FailureLogged(logs[i])) entry["failure"] = true;
+    lines.push_back(entry);
   }
   return lines;
 }

@@ -183,7 +183,7 @@ function render() {
   document.getElementById('changes').textContent = state.changes;
   const log = document.getElementById('log');
   log.innerHTML = state.log.map(l =>
-      `<span class="${l.priority >= 6 ? 'error' : ''}">${escape(l.text)}</span>`).join('\n');
+      `<span class="${l.failure ? 'failure' : l.priority >= 6 ? 'error' : ''}">${escape(l.text)}</span>`).join('\n');
   log.scrollTop = log.scrollHeight;  // the newest lines
 }
 
