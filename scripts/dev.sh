@@ -21,9 +21,10 @@ set -euo pipefail
 cd "$(dirname "$0")/.."
 
 # The library needs SQLite and Boost's headers; korrin-sim adds
-# Boost.Program_options, libedit and dtl; the tests GoogleTest and GoogleMock.
+# Boost.Program_options, libedit, dtl and nlohmann-json (the views as JSON);
+# the tests GoogleTest and GoogleMock.
 packages=(g++ make cmake pkg-config libsqlite3-dev libboost-dev libboost-program-options-dev
-          libedit-dev libdtl-dev libgtest-dev libgmock-dev libcpp-httplib-dev nlohmann-json3-dev)
+          libedit-dev libdtl-dev nlohmann-json3-dev libcpp-httplib-dev libgtest-dev libgmock-dev)
 
 install_missing_packages() {
   local missing=() p
@@ -68,7 +69,7 @@ build_fuzzer() {
 arm_packages=(g++-arm-linux-gnueabihf qemu-user googletest file)
 arm_sysroot_packages=(libsqlite3-0 libsqlite3-dev libboost1.74-dev libboost-program-options1.74.0
                       libboost-program-options1.74-dev libedit2 libedit-dev libbsd0 libmd0
-                      libtinfo6 libdtl-dev)
+                      libtinfo6 libdtl-dev nlohmann-json3-dev)
 arm_toolchain=(-DCMAKE_TOOLCHAIN_FILE="$PWD/cmake/arm-linux-gnueabihf.cmake"
                -DKORRIN_ARM_SYSROOT="$PWD/build-arm/sysroot")
 

@@ -7,7 +7,7 @@
 //
 //   cmake --install build --prefix "$PWD/out"
 //   export PKG_CONFIG_PATH="$PWD/out/LIB/pkgconfig"
-//   c++ -std=c++17 examples/host/main.cpp -o host $(pkg-config --cflags --libs korrin-data)
+//   c++ examples/host/main.cpp -o host $(pkg-config --cflags --libs korrin-data)
 //   LD_LIBRARY_PATH="$PWD/out/LIB" ./host
 //
 // Off the phone the engine runs on the simulated device, whose control header
@@ -23,9 +23,10 @@
 // (A device compiler may predate __has_include; it then skips this part.)
 #if defined(__has_include)
 #if __has_include(<sim/device.h>)
+#include <ftw.h>
 #include <sim/device.h>
+#include <stdio.h>
 
-#include <filesystem>
 #define HOST_ON_SIMULATED_DEVICE 1
 #endif
 #endif
@@ -64,7 +65,14 @@ int main() {
 #ifdef HOST_ON_SIMULATED_DEVICE
   // The engine keeps the database open until the process ends; on Linux the
   // folder can go from under it.
-  if (!temporaryRoot.empty()) std::filesystem::remove_all(temporaryRoot);
+  if (!temporaryRoot.empty()) {
+    struct Remove {
+      static int Entry(const char* path, const struct stat*, int, struct FTW*) {
+        return remove(path);
+      }
+    };
+    nftw(temporaryRoot.c_str(), Remove::Entry, 16, FTW_DEPTH | FTW_PHYS);
+  }
 #endif
   return 0;
 }

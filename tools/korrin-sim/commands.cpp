@@ -9,6 +9,7 @@
 #include "calls.h"
 #include "cli.h"
 #include "korrin-data/korrin-data.h"
+#include "phone-db.h"
 #include "session.h"
 #include "sim/device.h"
 #include "views.h"
@@ -394,14 +395,33 @@ void RunSampleDevice(Session&, const Args&) { Dev().LoadSampleDevice(); }
 
 void RunSay(Session&, const Args& args) { Out() << args.rest() << "\n"; }
 
+// --wide (grids only), --json and --csv.
+void AddStyleOptions(po::options_description& options, bool grids) {
+  if (grids) {
+    options.add_options()("wide", po::bool_switch(),
+                          "cut no label: columns as wide as their widest");
+  }
+  options.add_options()("json", po::bool_switch(), "as JSON: an array, one object a line")(
+      "csv", po::bool_switch(), "as CSV (RFC 4180), a header line first");
+}
+
+ViewStyle StyleOf(const Args& args) {
+  bool json = args.Get<bool>("json"), csv = args.Get<bool>("csv");
+  if (json && csv) throw UsageError("--json or --csv, not both");
+  ViewStyle style = {ViewStyle::kGrid, args.Has("wide") && args.Get<bool>("wide")};
+  if (json) style.format = ViewStyle::kJson;
+  if (csv) style.format = ViewStyle::kCsv;
+  return style;
+}
+
 void RunLayout(Session& session, const Args& args) {
   int menuId = args.Has("MENUID") ? ParseInt(args.Text("MENUID"), "MENUID") : 1;
-  PrintMenuLayout(session.DatabasePath(), menuId, args.Get<bool>("ids"), Out());
+  PrintMenuLayout(session.DatabasePath(), menuId, args.Get<bool>("ids"), StyleOf(args), Out());
 }
 
 void RunFolder(Session& session, const Args& args) {
   PrintFolder(session.DatabasePath(), ParseInt(args.Text("BOXID"), "BOXID"),
-              args.Get<bool>("ids"), Out());
+              args.Get<bool>("ids"), StyleOf(args), Out());
 }
 
 LauncherDataManager& StartedStore() {
@@ -411,10 +431,10 @@ LauncherDataManager& StartedStore() {
   return korrin::DataManager();
 }
 
-void RunDownloads(Session&, const Args&) {
+void RunDownloads(Session&, const Args& args) {
   LauncherDataManager& store = StartedStore();
   PrintComputedView(store.GetPageDataListByDownload(1, false),
-                    store.GetBoxDataListByDownload(1, false), 4, Out());
+                    store.GetBoxDataListByDownload(1, false), 4, StyleOf(args), Out());
 }
 
 void RunAlphabetical(Session&, const Args& args) {
@@ -423,7 +443,7 @@ void RunAlphabetical(Session&, const Args& args) {
   LauncherDataManager& store = StartedStore();
   PrintComputedView(store.GetPageDataListByAlphabeticalOrder(parentId, folder),
                     store.GetBoxDataListByAlphabeticalOrder(parentId, folder), folder ? 3 : 4,
-                    Out());
+                    StyleOf(args), Out());
 }
 
 void RunLog(Session& session, const Args& args) {
@@ -434,12 +454,16 @@ void RunLog(Session& session, const Args& args) {
     const sim::LogLine& line = lines[i];
     if (line.priority < lowest) continue;
     if (args.Has("grep") && line.text.find(args.Text("grep")) == std::string::npos) continue;
-    PrintLogLine(line, args.Get<bool>("message"), Out());
+    if (args.Get<bool>("dlogutil")) {
+      PrintDlogutilLine(line, Out());
+    } else {
+      PrintLogLine(line, args.Get<bool>("message"), Out());
+    }
   }
 }
 
 void RunTables(Session& session, const Args& args) {
-  PrintTables(session.DatabasePath(), args.List("TABLE"), Out());
+  PrintTables(session.DatabasePath(), args.List("TABLE"), StyleOf(args).format, Out());
 }
 
 void RunChanges(Session& session, const Args&) {
@@ -598,28 +622,38 @@ std::vector<Command> MakeCommands() {
       // ---- Views.
       {"layout", "[MENUID]", "show a menu's stored layout",
        "Shows menu MENUID (1) page by page as 4-column grids, each folder's pages\n"
-       "(3 by 3) under the page holding it. [Name] is a folder, <Name> a shortcut.",
-       "layout", kView, kParsed,
+       "(3 by 3) under the page holding it. [Name] is a folder, <Name> a shortcut.\n"
+       "Cells are 16 terminal columns (CJK and emoji take two); a wider label is cut\n"
+       "with ~. --json and --csv give one record a box: page, pageId, folder (its\n"
+       "folder box, on a folder's page), boxId, col, row, label, appId, name,\n"
+       "isFolder, boxType.",
+       "layout --wide\nlayout --csv", kView, kParsed,
        [](po::options_description& o) {
          o.add_options()("ids", po::bool_switch(), "show box and page ids");
+         AddStyleOptions(o, true);
        },
        RunLayout},
       {"folder", "BOXID", "show one folder's pages",
-       "Shows the pages of folder box BOXID as 3-column grids.", "folder 40 --ids", kView,
-       kParsed,
+       "Shows the pages of folder box BOXID as 3-column grids, or as `layout` does\n"
+       "with --wide, --json or --csv.",
+       "folder 40 --ids", kView, kParsed,
        [](po::options_description& o) {
          o.add_options()("ids", po::bool_switch(), "show box and page ids");
+         AddStyleOptions(o, true);
        },
        RunFolder},
       {"downloads", "", "show the download view",
-       "Shows the engine's download view: the boxes not preloaded, on virtual pages.",
-       "downloads", kView, kParsed, NoOptions, RunDownloads},
+       "Shows the engine's download view: the boxes not preloaded, on virtual pages;\n"
+       "--wide, --json and --csv as for `layout`.",
+       "downloads", kView, kParsed, [](po::options_description& o) { AddStyleOptions(o, true); },
+       RunDownloads},
       {"alphabetical", "[PARENTID]", "show the alphabetical view",
        "Shows the engine's alphabetical view of menu PARENTID (1), or with --folder of\n"
-       "folder box PARENTID.",
+       "folder box PARENTID; --wide, --json and --csv as for `layout`.",
        "alphabetical\nalphabetical 40 --folder", kView, kParsed,
        [](po::options_description& o) {
          o.add_options()("folder", po::bool_switch(), "PARENTID is a folder box");
+         AddStyleOptions(o, true);
        },
        RunAlphabetical},
       {"log", "", "show the platform log",
@@ -638,7 +672,8 @@ std::vector<Command> MakeCommands() {
                          "this priority and above")(
              "grep", po::value<std::string>()->value_name("TEXT"), "lines holding TEXT")(
              "all", po::bool_switch(), "every line since the start")(
-             "message", po::bool_switch(), "leave out the file, function and line");
+             "message", po::bool_switch(), "leave out the file, function and line")(
+             "dlogutil", po::bool_switch(), "as a phone's `dlogutil -v brief` prints it");
        },
        RunLog},
       {"trace", "[on|off]", "record the SQL the store runs, or show it",
@@ -651,8 +686,10 @@ std::vector<Command> MakeCommands() {
        "Prints how many times each platform call was made since the device began.",
        "count preference_get_int mdm_get_service", kView, kParsed, NoOptions, RunCount},
       {"tables", "[TABLE...]", "show the raw tables",
-       "Shows every row of the layout database's tables (Menus, Pages, Boxes).",
-       "tables Menus Pages", kView, kParsed, NoOptions, RunTables},
+       "Shows every row of the layout database's tables (Menus, Pages, Boxes). --json\n"
+       "gives one object a row, its table first; --csv one table, named.",
+       "tables Menus Pages\ntables Boxes --csv", kView, kParsed,
+       [](po::options_description& o) { AddStyleOptions(o, false); }, RunTables},
       {"changes", "", "show what the last command did to the database",
        "Shows the rows the last command that changed something added (+), removed (-)\n"
        "and changed (~, column by column).",
@@ -681,6 +718,10 @@ const std::vector<Command>& Topics() {
        "call InsertMenuData name=$'two\\nlines' type=0\n"
        "game com.acme.x --label \"\"",
        false, Command::kOptions, NoOptions, nullptr},
+      {"quit", "", "end the shell, or the script here (also exit, .quit)",
+       "Ends the shell as Ctrl-D does; in a script, ends that script there: the\n"
+       "lines after it do not run.",
+       "quit", false, Command::kOptions, NoOptions, nullptr},
   };
   return topics;
 }
@@ -719,6 +760,7 @@ const std::vector<Command>& Commands() {
     std::vector<Command> all = MakeCommands();
     for (Command& c : DeviceCommands()) all.push_back(c);
     for (Command& c : LayoutCommands()) all.push_back(c);
+    for (Command& c : PhonedbCommands()) all.push_back(c);
     return all;
   }();
   return commands;
@@ -736,12 +778,23 @@ void PrintCommandList(std::ostream& out) {
   out << "usage: korrin-sim [demo] [--root DIR | --keep]\n"
          "       korrin-sim run [--root DIR | --keep] FILE...    (FILE - is standard input)\n"
          "       korrin-sim shell [--root DIR | --keep]\n"
+         "       korrin-sim open FILE [SCRIPT...] [--in-place] [--root DIR | --keep]\n"
+         "       korrin-sim COMMAND [ARG...] [--db FILE [--in-place]]\n"
+         "       korrin-sim serve [--root DIR | --db FILE] [--port N] [--script FILE]\n"
          "       korrin-sim help [COMMAND]\n"
          "       korrin-sim --version\n\n"
          "Without --root, the device lives in a fresh folder under $TMPDIR (/tmp),\n"
          "removed at exit unless --keep (or a failed `run`, which says so). A kept\n"
          "root keeps the phone in ROOT/device.ksim beside its database, and the next\n"
          "run on that root starts with both.\n"
+         "`open` plays the scripts (or a shell) on a phone's layout database FILE: on\n"
+         "a copy, or with --in-place on FILE itself; `start` opens it in the engine.\n"
+         "A COMMAND alone runs once, with --db on a copy of FILE: `korrin-sim check\n"
+         "--db phone.db` exits 1 when it finds a problem.\n"
+         "`serve` shows the phone's home screen in a browser, live, on 127.0.0.1\n"
+         "only (default port 8080): events, edits and the log, each edit also\n"
+         "shown as the command that makes it; `serve --script tools/korrin-sim/\n"
+         "demo.ksim` serves the demo.\n"
          "Scripts hold one command per line; # starts a comment line. Words split\n"
          "as in the POSIX shell, nothing expanded: `help quoting`.\n\n"
          "commands:\n";

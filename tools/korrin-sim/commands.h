@@ -59,6 +59,8 @@ struct Command {
 std::vector<Command> DeviceCommands();
 // make-folder, move, rename, remove-box and let (layout-verbs.cpp).
 std::vector<Command> LayoutCommands();
+// schema, sql, export, import, check and replay-log (phone-db.cpp).
+std::vector<Command> PhonedbCommands();
 
 const std::vector<Command>& Commands();
 // The command, or null.

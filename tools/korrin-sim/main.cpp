@@ -2,9 +2,12 @@
 // workstation. It plays the demo story, scenario scripts, or commands typed
 // into a shell; `korrin-sim --help` lists the commands.
 #include <errno.h>
+#include <locale.h>
+#include <signal.h>
 #include <stdlib.h>
 #include <string.h>
 #include <unistd.h>
+#include <wchar.h>
 
 #include <editline/readline.h>
 
@@ -19,9 +22,11 @@
 
 #include "calls.h"
 #include "cli.h"
+#include "complete.h"
 #include "demo-story.h"
 #include "demo.h"
 #include "device-state.h"
+#include "phone-db.h"
 #include "serve.h"
 #include "session.h"
 #include "sim/device.h"
@@ -98,6 +103,26 @@ int Leave(const DeviceRoot& root, int status, bool inspect = false) {
   return status;
 }
 
+// The phone's database that `open` and --db bring in: the device root's
+// database becomes a copy of |file|, or the file itself with |inPlace|.
+struct Opened {
+  std::string file;
+  bool inPlace;
+};
+
+// Places |opened| (when given) under the root UseDeviceRoot laid out; false,
+// said on stderr, when it cannot.
+bool Place(const Opened* opened) {
+  if (opened == NULL) return true;
+  try {
+    korrin_sim::PlaceDatabase(opened->file, opened->inPlace);
+  } catch (const std::exception& e) {
+    std::cerr << "korrin-sim: " << e.what() << "\n";
+    return false;
+  }
+  return true;
+}
+
 int Demo(DeviceRoot root) {
   if (!UseDeviceRoot(root)) return 1;
   if (root.kept()) std::cout << "device root: " << root.path << "\n";
@@ -105,7 +130,7 @@ int Demo(DeviceRoot root) {
   return Leave(root, korrin_sim::PlayDemo(story, std::cout, isatty(STDOUT_FILENO)) ? 0 : 1);
 }
 
-int Run(DeviceRoot root, const std::vector<std::string>& files) {
+int Run(DeviceRoot root, const std::vector<std::string>& files, const Opened* opened = NULL) {
   if (files.empty()) {
     std::cerr << "korrin-sim: run what? usage: korrin-sim run [--root DIR] FILE... (-: stdin)\n";
     return 2;
@@ -123,6 +148,7 @@ int Run(DeviceRoot root, const std::vector<std::string>& files) {
     }
   }
   if (!UseDeviceRoot(root)) return 1;
+  if (!Place(opened)) return Leave(root, 1);
   korrin_sim::Session session;
   for (const std::string& file : files) {
     std::ifstream opened;
@@ -136,37 +162,115 @@ int Run(DeviceRoot root, const std::vector<std::string>& files) {
   return Leave(root, 0);
 }
 
+// Ctrl-C drops the line being typed and prompts afresh, as a shell does.
+// libedit's own handler would only pass the signal on, which ends the session,
+// so the shell reads keys itself: an interrupted read ends the line as Enter
+// does, and ReadLine throws that line away.
+volatile sig_atomic_t interrupted = 0;
+
+void OnInterrupt(int) { interrupted = 1; }
+
+// One character for libedit, which takes the value returned as the character
+// itself: UTF-8 is decoded here.
+int ReadKey(FILE*) {
+  mbstate_t state;
+  memset(&state, 0, sizeof state);
+  for (;;) {
+    char byte;
+    ssize_t got = read(STDIN_FILENO, &byte, 1);
+    if (got < 0 && errno == EINTR) {
+      if (interrupted) return '\n';
+      continue;
+    }
+    if (got <= 0) return -1;
+    wchar_t c;
+    size_t length = mbrtowc(&c, &byte, 1, &state);
+    if (length == static_cast<size_t>(-2)) continue;
+    if (length == static_cast<size_t>(-1)) return static_cast<unsigned char>(byte);
+    return static_cast<int>(c);
+  }
+}
+
+// Tab: the words korrin_sim::Completions offers where the cursor is, never
+// file names.
+char* NextCompletion(const char* word, int state) {
+  static std::vector<std::string> matches;
+  static size_t next;
+  if (state == 0) {
+    size_t start = static_cast<size_t>(rl_point) - strlen(word);
+    matches = korrin_sim::Completions(std::string(rl_line_buffer, start), word);
+    next = 0;
+  }
+  return next < matches.size() ? strdup(matches[next++].c_str()) : NULL;
+}
+
+char** CompleteWord(const char* word, int, int) {
+  rl_attempted_completion_over = 1;
+  return rl_completion_matches(word, NextCompletion);
+}
+
+void SetUpTerminal() {
+  setlocale(LC_CTYPE, "C.UTF-8");  // libedit shows and edits UTF-8 only in such a locale
+  rl_catch_signals = 0;
+  rl_getc_function = ReadKey;
+  rl_attempted_completion_function = CompleteWord;
+  struct sigaction action;
+  memset(&action, 0, sizeof action);
+  action.sa_handler = OnInterrupt;
+  sigemptyset(&action.sa_mask);
+  sigaction(SIGINT, &action, NULL);
+}
+
 // One line from the terminal with editing and history, or from a pipe.
 bool ReadLine(const char* prompt, std::string& line) {
   if (!isatty(STDIN_FILENO)) return static_cast<bool>(std::getline(std::cin, line));
+  interrupted = 0;  // a Ctrl-C while a command ran is not one for this line
   char* text = readline(prompt);
-  if (text == NULL) return false;
+  while (interrupted) {
+    interrupted = 0;
+    free(text);
+    text = readline(prompt);
+  }
+  if (text == NULL) {
+    std::cout << std::endl;  // Ctrl-D leaves the terminal's prompt on a line of its own
+    return false;
+  }
   line = text;
   free(text);
   if (!line.empty()) add_history(line.c_str());
   return true;
 }
 
-int Serve(DeviceRoot root, const korrin_sim::ServeOptions& options) {
+int Serve(DeviceRoot root, const korrin_sim::ServeOptions& options, const Opened* opened) {
 #ifdef KORRIN_SIM_SERVE
   if (!UseDeviceRoot(root)) return 1;
+  if (!Place(opened)) return Leave(root, 1);
   korrin_sim::Session session;
   return Leave(root, korrin_sim::Serve(session, options));
 #else
   (void)root;
   (void)options;
+  (void)opened;
   std::cerr << "korrin-sim: this build has no `serve` (it was built without cpp-httplib)\n";
   return 2;
 #endif
 }
 
-int Shell(DeviceRoot root) {
+int Shell(DeviceRoot root, const Opened* opened = NULL) {
   if (!UseDeviceRoot(root)) return 1;
+  if (!Place(opened)) return Leave(root, 1);
+  if (opened != NULL) {
+    std::cout << "the database of " << opened->file
+              << (opened->inPlace ? " itself (--in-place): changes go to the file\n"
+                                  : " as a copy: the file stays as it is\n")
+              << "`start` opens it in the engine (for downloads, alphabetical, events)\n";
+  }
   std::cout << "korrin-sim shell on the device in " << root.path
             << (root.kept() ? "" : " (removed at exit; --keep keeps it)")
             << "\n`help` lists the commands; Ctrl-D or `quit` ends.\n";
   const char* home = getenv("HOME");
   std::string history = std::string(home != NULL ? home : ".") + "/.korrin_sim_history";
+  if (isatty(STDIN_FILENO)) SetUpTerminal();  // before libedit starts, in read_history
   read_history(history.c_str());
   korrin_sim::Session session;
   using Fed = korrin_sim::Session::Fed;
@@ -174,7 +278,7 @@ int Shell(DeviceRoot root) {
   std::string line;
   for (bool more = true; more;) {
     more = ReadLine(fed == Fed::kCollected ? "  ...> " : "korrin> ", line);
-    if (more && fed != Fed::kCollected && (line == "quit" || line == "exit")) more = false;
+    if (more && fed != Fed::kCollected && korrin_sim::Session::IsQuit(line)) more = false;
     try {
       fed = more ? session.Feed(line) : session.Finish();
       if (fed == Fed::kChecked) std::cout << "as expected\n";
@@ -210,6 +314,51 @@ int Help(const std::vector<std::string>& words) {
   }
 }
 
+// `korrin-sim COMMAND [ARGS] [--db FILE [--in-place]]`: one command, on a
+// phone's database when --db names one, in a device root of its own.
+int OneShot(int argc, char** argv) {
+  const korrin_sim::Command& command = *korrin_sim::FindCommand(argv[1]);
+  po::options_description own;
+  own.add_options()("db", po::value<std::string>())("in-place", po::bool_switch())(
+      "root", po::value<std::string>())("keep", po::bool_switch());
+  po::variables_map values;
+  std::vector<std::string> words;
+  try {
+    po::parsed_options parsed = po::command_line_parser(argc - 1, argv + 1)
+                                    .options(own)
+                                    .style(po::command_line_style::unix_style &
+                                           ~po::command_line_style::allow_guessing)
+                                    .allow_unregistered()
+                                    .run();
+    po::store(parsed, values);
+    words = po::collect_unrecognized(parsed.options, po::include_positional);
+  } catch (const po::error& e) {
+    std::cerr << "korrin-sim: " << e.what() << " (korrin-sim --help)\n";
+    return 2;
+  }
+  std::string line = command.name;
+  for (const std::string& word : words) {
+    line += " " + (command.parsing == korrin_sim::Command::kText ? word : korrin_sim::ShellWord(word));
+  }
+  DeviceRoot root{values.count("root") ? values["root"].as<std::string>() : "",
+                  values.count("root") == 0, values["keep"].as<bool>()};
+  if (!UseDeviceRoot(root)) return 1;
+  Opened opened{values.count("db") ? values["db"].as<std::string>() : "",
+                values["in-place"].as<bool>()};
+  if (!Place(values.count("db") ? &opened : NULL)) return Leave(root, 1);
+  korrin_sim::Session session;
+  try {
+    // These views are the engine's own answers: it needs the database open.
+    if (command.name == "downloads" || command.name == "alphabetical") session.Execute("start");
+    session.Execute(line);
+  } catch (const std::exception& e) {
+    std::cout << std::flush;
+    std::cerr << "korrin-sim: " << e.what() << "\n";
+    return Leave(root, 1);
+  }
+  return Leave(root, 0);
+}
+
 }  // namespace
 
 int main(int argc, char** argv) {
@@ -220,10 +369,14 @@ int main(int argc, char** argv) {
   // log for `log`: it echoes the log only when KORRIN_SIM_LOG asks.
   const char* echo = getenv("KORRIN_SIM_LOG");
   if (echo == NULL || *echo == '\0') sim::Device::Get().EchoLogs(false);
+  if (argc > 1 && korrin_sim::FindCommand(argv[1]) != NULL) return OneShot(argc, argv);
   po::options_description visible("options");
   visible.add_options()("root", po::value<std::string>()->value_name("DIR"),
                         "keep the device (its phone and database) in DIR")(
       "keep", "keep the temporary device folder at exit")(
+      "in-place", "open: change FILE itself, not a copy")(
+      "db", po::value<std::string>()->value_name("FILE"),
+      "serve: show a phone's layout database FILE (on a copy, as open does)")(
       "port", po::value<int>()->default_value(8080)->value_name("N"),
       "serve: the port on 127.0.0.1 (0: any free one)")(
       "script", po::value<std::string>()->value_name("FILE"), "serve: play FILE first")(
@@ -239,7 +392,9 @@ int main(int argc, char** argv) {
     po::notify(values);
   } catch (const po::unknown_option& e) {
     std::cerr << "korrin-sim: unknown option '" << e.get_option_name() << "'"
-              << korrin_sim::DidYouMean(e.get_option_name(), {"--root", "--keep", "--port", "--script", "--help", "--version"})
+              << korrin_sim::DidYouMean(e.get_option_name(), {"--root", "--keep", "--in-place", "--db",
+                                                              "--port", "--script", "--help",
+                                                              "--version"})
               << " (korrin-sim --help)\n";
     return 2;
   } catch (const po::error& e) {
@@ -259,9 +414,18 @@ int main(int argc, char** argv) {
   if (values.count("help")) return Help({});
   if (mode == "help") return Help(files);
   if (mode == "run") return Run(root, files);
+  if (mode == "open") {
+    if (files.empty()) {
+      std::cerr << "korrin-sim: open what? usage: korrin-sim open FILE [SCRIPT...]\n";
+      return 2;
+    }
+    Opened opened{files[0], values.count("in-place") > 0};
+    std::vector<std::string> scripts(files.begin() + 1, files.end());
+    return scripts.empty() ? Shell(root, &opened) : Run(root, scripts, &opened);
+  }
   if (mode != "demo" && mode != "shell" && mode != "serve") {
     std::cerr << "korrin-sim: unknown mode '" << mode << "'"
-              << korrin_sim::DidYouMean(mode, {"demo", "run", "shell", "serve", "help"})
+              << korrin_sim::DidYouMean(mode, {"demo", "run", "shell", "open", "serve", "help"})
               << " (korrin-sim --help)\n";
     return 2;
   }
@@ -274,7 +438,8 @@ int main(int argc, char** argv) {
     korrin_sim::ServeOptions serve;
     serve.port = values["port"].as<int>();
     if (values.count("script")) serve.script = values["script"].as<std::string>();
-    return Serve(root, serve);
+    Opened opened{values.count("db") ? values["db"].as<std::string>() : "", false};
+    return Serve(root, serve, values.count("db") ? &opened : NULL);
   }
   return mode == "demo" ? Demo(root) : Shell(root);
 }

@@ -363,6 +363,13 @@ Session::Fed Session::Feed(const std::string& line) {
 
 Session::Fed Session::Finish() { return block_ ? Feed("") : Fed::kRan; }
 
+bool Session::IsQuit(const std::string& line) {
+  size_t first = line.find_first_not_of(" \t");
+  if (first == std::string::npos) return false;
+  std::string word = line.substr(first, line.find_last_not_of(" \t") + 1 - first);
+  return word == "quit" || word == "exit" || word == ".quit";
+}
+
 bool Session::RunScript(std::istream& in, const std::string& file, std::ostream& errors) {
   std::string line;
   int number = 0;
@@ -371,6 +378,7 @@ bool Session::RunScript(std::istream& in, const std::string& file, std::ostream&
     while (std::getline(in, line)) {
       ++number;
       if (!block_) at = number;
+      if (!block_ && IsQuit(line)) break;
       where_ = file + ":" + std::to_string(number) + ": ";
       Feed(line);
     }

@@ -57,9 +57,13 @@ class Session {
   // The input has ended: an open block is closed and checked.
   Fed Finish();
 
-  // Plays a script to its end, or to its first error, which it reports as
-  // "FILE:LINE: message" on |errors| (a block's error at its `expect`). True
-  // when every line ran.
+  // `quit`, `exit` or `.quit` (blanks around it allowed): ends the shell, or
+  // the script it stands in.
+  static bool IsQuit(const std::string& line);
+
+  // Plays a script to its end (or its `quit`), or to its first error, which
+  // it reports as "FILE:LINE: message" on |errors| (a block's error at its
+  // `expect`). True when every line ran.
   bool RunScript(std::istream& in, const std::string& file, std::ostream& errors);
 
   // ---- Named ids: `$last` and the names `let` binds, written $NAME.

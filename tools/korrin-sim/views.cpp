@@ -6,17 +6,19 @@
 #include <stdlib.h>
 
 #include <algorithm>
+#include <nlohmann/json.hpp>
 #include <set>
 
 #include "cli.h"
 #include "launcher-data-manager/game-data.h"
 #include "sim/device.h"
+#include "width.h"
 
 namespace korrin_sim {
 
 namespace {
 
-const size_t kCellWidth = 16;
+const size_t kCellWidth = 16;  // terminal columns
 const int kMenuColumns = 4;
 const int kFolderColumns = 3;
 
@@ -35,6 +37,13 @@ struct Value {
     std::string hex = "x'";
     for (unsigned char c : text) hex += std::string(1, kHex[c >> 4]) + kHex[c & 15];
     return hex + "'";
+  }
+  // As a JSON value: numbers as numbers, NULL as null, a blob as Show() does.
+  nlohmann::ordered_json Json() const {
+    if (type == SQLITE_NULL) return nullptr;
+    if (type == SQLITE_INTEGER) return atoll(text.c_str());
+    if (type == SQLITE_FLOAT) return atof(text.c_str());
+    return type == SQLITE_TEXT ? text : Show();
   }
 };
 typedef std::vector<Value> Row;
@@ -97,14 +106,55 @@ class Reader {
   sqlite3* db_;
 };
 
-// |text| cut or padded to |width| characters, counting UTF-8 sequences as one.
-std::string Cell(const std::string& text, size_t width) {
-  std::vector<size_t> starts;
-  for (size_t i = 0; i < text.size(); ++i) {
-    if ((static_cast<unsigned char>(text[i]) & 0xC0) != 0x80) starts.push_back(i);
+// ---- Records for other tools: one JSON object, or one CSV line, each.
+
+typedef nlohmann::ordered_json Record;
+
+const std::vector<std::string> kBoxColumns = {"page", "pageId",   "folder", "boxId",
+                                              "col",  "row",      "label",  "appId",
+                                              "name", "isFolder", "boxType"};
+
+Record BoxRecord(int pageNo, int pageId, const Record& folder, int boxId, int col, int row,
+                 const std::string& label, const std::string& appId, const std::string& name,
+                 bool isFolder, int boxType) {
+  return Record{{"page", pageNo}, {"pageId", pageId},     {"folder", folder},  {"boxId", boxId},
+                {"col", col},     {"row", row},           {"label", label},    {"appId", appId},
+                {"name", name},   {"isFolder", isFolder}, {"boxType", boxType}};
+}
+
+std::string CsvField(const Record& value) {
+  if (value.is_null()) return "";
+  std::string text = value.is_string() ? value.get<std::string>() : value.dump();
+  if (text.find_first_of(",\"\r\n") == std::string::npos) return text;
+  std::string quoted = "\"";
+  for (char c : text) quoted += c == '"' ? std::string("\"\"") : std::string(1, c);
+  return quoted + "\"";
+}
+
+// A JSON array with one record a line, or CSV with a header of |columns|.
+void PrintRecords(const std::vector<Record>& records, const std::vector<std::string>& columns,
+                  ViewStyle::Format format, std::ostream& out) {
+  if (format == ViewStyle::kJson) {
+    out << "[";
+    for (size_t i = 0; i < records.size(); ++i) {
+      // A label that is not UTF-8 still prints, with U+FFFD for its bad bytes.
+      out << (i ? ",\n" : "\n")
+          << records[i].dump(-1, ' ', false, nlohmann::json::error_handler_t::replace);
+    }
+    out << (records.empty() ? "]\n" : "\n]\n");
+    return;
   }
-  if (starts.size() > width) return text.substr(0, starts[width - 1]) + "~";
-  return text + std::string(width - starts.size(), ' ');
+  std::string line;
+  for (const std::string& column : columns) line += (line.empty() ? "" : ",") + column;
+  out << line << "\n";
+  for (const Record& record : records) {
+    line.clear();
+    for (size_t i = 0; i < columns.size(); ++i) {
+      Record::const_iterator value = record.find(columns[i]);
+      line += (i ? "," : "") + (value != record.end() ? CsvField(*value) : std::string());
+    }
+    out << line << "\n";
+  }
 }
 
 std::string TrimRight(std::string line) {
@@ -114,15 +164,40 @@ std::string TrimRight(std::string line) {
 
 // The boxes of one stored page, drawn as a grid, then the pages of each folder
 // on it, indented under it.
-void PrintStoredPage(const Reader& db, int64_t pageId, int columns, int indent, bool ids,
+void PrintStoredPage(const Reader& db, int64_t pageId, int columns, int indent, bool ids, bool wide,
                      std::ostream& out);
 
 // The folders being drawn, outermost first: a folder whose page holds the
 // folder itself (or one around it) is named, not drawn again forever.
 std::vector<int64_t> g_openFolders;
 
+// The boxes of one stored page and of the folders on it, as records.
+void CollectStoredPage(const Reader& db, const Row& page, const Record& folder,
+                       std::vector<Record>& records) {
+  for (const Row& box : db.Rows("SELECT boxId, isFolder, boxType, appId, name, col, row FROM "
+                                "Boxes WHERE pageId = ? ORDER BY row, col, boxId",
+                                page[0].Int())) {
+    bool isFolder = box[1].Int() != 0;
+    records.push_back(BoxRecord(page[1].Int(), page[0].Int(), folder, box[0].Int(), box[5].Int(),
+                                box[6].Int(),
+                                BoxLabel(isFolder, box[2].Int(), box[3].text, box[4].text),
+                                box[3].text, box[4].text, isFolder, box[2].Int()));
+    if (!isFolder || std::find(g_openFolders.begin(), g_openFolders.end(), box[0].Int()) !=
+                         g_openFolders.end()) {
+      continue;  // a folder that holds itself is listed once
+    }
+    g_openFolders.push_back(box[0].Int());
+    for (const Row& inner : db.Rows("SELECT pageId, pageNo FROM Pages WHERE isFolder = 1 AND "
+                                    "parentId = ? ORDER BY pageNo",
+                                    box[0].Int())) {
+      CollectStoredPage(db, inner, box[0].Int(), records);
+    }
+    g_openFolders.pop_back();
+  }
+}
+
 void PrintFolderPages(const Reader& db, int64_t boxId, const std::string& name, int indent,
-                      bool ids, std::ostream& out) {
+                      bool ids, bool wide, std::ostream& out) {
   if (std::find(g_openFolders.begin(), g_openFolders.end(), boxId) != g_openFolders.end()) {
     out << std::string(indent, ' ') << "folder " << Quote(name) << " (box " << boxId
         << ") holds itself: shown above\n";
@@ -141,11 +216,11 @@ void PrintFolderPages(const Reader& db, int64_t boxId, const std::string& name, 
     out << pad << "folder " << Quote(name) << ", page " << page[1].text;
     if (ids) out << " (pageId " << page[0].text << ")";
     out << "\n";
-    PrintStoredPage(db, page[0].Int(), kFolderColumns, indent, ids, out);
+    PrintStoredPage(db, page[0].Int(), kFolderColumns, indent, ids, wide, out);
   }
 }
 
-void PrintStoredPage(const Reader& db, int64_t pageId, int columns, int indent, bool ids,
+void PrintStoredPage(const Reader& db, int64_t pageId, int columns, int indent, bool ids, bool wide,
                      std::ostream& out) {
   std::vector<Row> boxes = db.Rows(
       "SELECT boxId, isFolder, boxType, appId, name, col, row FROM Boxes WHERE pageId = ? "
@@ -157,9 +232,11 @@ void PrintStoredPage(const Reader& db, int64_t pageId, int columns, int indent, 
     if (ids) label = "#" + box[0].text + " " + label;
     grid.push_back(GridBox{box[5].Int(), box[6].Int(), label});
   }
-  PrintGrid(grid, columns, indent, out);
+  PrintGrid(grid, columns, indent, out, wide);
   for (const Row& box : boxes) {
-    if (box[1].Int() != 0) PrintFolderPages(db, box[0].Int(), box[4].text, indent + 4, ids, out);
+    if (box[1].Int() != 0) {
+      PrintFolderPages(db, box[0].Int(), box[4].text, indent + 4, ids, wide, out);
+    }
   }
 }
 
@@ -197,7 +274,8 @@ std::string BoxLabel(bool isFolder, int boxType, const std::string& appId,
   return app != NULL && app->label && !app->label->empty() ? *app->label : appId;
 }
 
-void PrintGrid(const std::vector<GridBox>& boxes, int columns, int indent, std::ostream& out) {
+void PrintGrid(const std::vector<GridBox>& boxes, int columns, int indent, std::ostream& out,
+               bool wide) {
   std::string pad(indent, ' ');
   if (boxes.empty()) {
     out << pad << " (empty)\n";
@@ -211,6 +289,13 @@ void PrintGrid(const std::vector<GridBox>& boxes, int columns, int indent, std::
       elsewhere.push_back(&box);
     }
   }
+  std::vector<size_t> widths(columns + 1, kCellWidth);
+  if (wide) {
+    std::fill(widths.begin(), widths.end(), 0);
+    for (const auto& cell : cells) {
+      widths[cell.first.second] = std::max(widths[cell.first.second], TextColumns(cell.second));
+    }
+  }
   auto drawRow = [&](int row) {
     std::string line = pad + (row < 10 ? " " : "") + std::to_string(row) + " ";
     int last = 0;
@@ -220,7 +305,7 @@ void PrintGrid(const std::vector<GridBox>& boxes, int columns, int indent, std::
     for (int col = 1; col <= last; ++col) {
       std::map<std::pair<int, int>, std::string>::const_iterator cell =
           cells.find(std::make_pair(row, col));
-      line += "| " + Cell(cell != cells.end() ? cell->second : "", kCellWidth) + " ";
+      line += "| " + FitColumns(cell != cells.end() ? cell->second : "", widths[col]) + " ";
     }
     out << TrimRight(line) << "\n";
   };
@@ -243,7 +328,8 @@ void PrintGrid(const std::vector<GridBox>& boxes, int columns, int indent, std::
   }
 }
 
-void PrintMenuLayout(const std::string& dbPath, int menuId, bool ids, std::ostream& out) {
+void PrintMenuLayout(const std::string& dbPath, int menuId, bool ids, const ViewStyle& style,
+                     std::ostream& out) {
   Reader db(dbPath);
   if (!db.ok()) {
     out << kNoDatabase;
@@ -254,20 +340,27 @@ void PrintMenuLayout(const std::string& dbPath, int menuId, bool ids, std::ostre
     out << "no menu " << menuId << "\n";
     return;
   }
-  out << "menu " << menuId << " " << menu[0][0].Show() << "\n";
   std::vector<Row> pages = db.Rows(
       "SELECT pageId, pageNo FROM Pages WHERE isFolder = 0 AND parentId = ? ORDER BY pageNo",
       menuId);
+  if (style.format != ViewStyle::kGrid) {
+    std::vector<Record> records;
+    for (const Row& page : pages) CollectStoredPage(db, page, nullptr, records);
+    PrintRecords(records, kBoxColumns, style.format, out);
+    return;
+  }
+  out << "menu " << menuId << " " << menu[0][0].Show() << "\n";
   if (pages.empty()) out << " (no pages)\n";
   for (const Row& page : pages) {
     out << "page " << page[1].text;
     if (ids) out << " (pageId " << page[0].text << ")";
     out << "\n";
-    PrintStoredPage(db, page[0].Int(), kMenuColumns, 0, ids, out);
+    PrintStoredPage(db, page[0].Int(), kMenuColumns, 0, ids, style.wide, out);
   }
 }
 
-void PrintFolder(const std::string& dbPath, int boxId, bool ids, std::ostream& out) {
+void PrintFolder(const std::string& dbPath, int boxId, bool ids, const ViewStyle& style,
+                 std::ostream& out) {
   Reader db(dbPath);
   if (!db.ok()) {
     out << kNoDatabase;
@@ -278,12 +371,37 @@ void PrintFolder(const std::string& dbPath, int boxId, bool ids, std::ostream& o
     out << "no folder box " << boxId << "\n";
     return;
   }
-  PrintFolderPages(db, boxId, box[0][0].text, 0, ids, out);
+  if (style.format != ViewStyle::kGrid) {
+    std::vector<Record> records;
+    for (const Row& page : db.Rows("SELECT pageId, pageNo FROM Pages WHERE isFolder = 1 AND "
+                                   "parentId = ? ORDER BY pageNo",
+                                   boxId)) {
+      CollectStoredPage(db, page, boxId, records);
+    }
+    PrintRecords(records, kBoxColumns, style.format, out);
+    return;
+  }
+  PrintFolderPages(db, boxId, box[0][0].text, 0, ids, style.wide, out);
 }
 
-void PrintComputedView(const std::vector<boost::shared_ptr<GamePageData> >& pages,
-                       const std::vector<boost::shared_ptr<GameBoxData> >& boxes, int columns,
-                       std::ostream& out) {
+void PrintComputedView(const std::vector<boost::shared_ptr<GamePageData>>& pages,
+                       const std::vector<boost::shared_ptr<GameBoxData>>& boxes, int columns,
+                       const ViewStyle& style, std::ostream& out) {
+  if (style.format != ViewStyle::kGrid) {
+    std::vector<Record> records;
+    for (const boost::shared_ptr<GamePageData>& page : pages) {
+      for (const boost::shared_ptr<GameBoxData>& box : boxes) {
+        if (box->pageId != page->pageId) continue;
+        records.push_back(BoxRecord(page->pageNo, page->pageId,
+                                    page->isFolder ? Record(page->parentId) : Record(), box->boxId,
+                                    box->col, box->row,
+                                    BoxLabel(box->isFolder, box->boxType, box->appId, box->name),
+                                    box->appId, box->name, box->isFolder, box->boxType));
+      }
+    }
+    PrintRecords(records, kBoxColumns, style.format, out);
+    return;
+  }
   if (pages.empty()) out << " (no pages)\n";
   for (const boost::shared_ptr<GamePageData>& page : pages) {
     out << "page " << page->pageNo << " (pageId " << page->pageId << ")\n";
@@ -293,12 +411,12 @@ void PrintComputedView(const std::vector<boost::shared_ptr<GamePageData> >& page
       grid.push_back(GridBox{box->col, box->row,
                              BoxLabel(box->isFolder, box->boxType, box->appId, box->name)});
     }
-    PrintGrid(grid, columns, 0, out);
+    PrintGrid(grid, columns, 0, out, style.wide);
   }
 }
 
 void PrintTables(const std::string& dbPath, const std::vector<std::string>& tables,
-                 std::ostream& out) {
+                 ViewStyle::Format format, std::ostream& out) {
   Reader db(dbPath);
   if (!db.ok()) {
     out << kNoDatabase;
@@ -310,9 +428,24 @@ void PrintTables(const std::string& dbPath, const std::vector<std::string>& tabl
       throw UsageError("no table '" + table + "' (there are Menus, Pages and Boxes)");
     }
   }
+  if (format == ViewStyle::kCsv && tables.size() != 1) {
+    throw UsageError("--csv shows one table: name it (Menus, Pages or Boxes)");
+  }
+  std::vector<Record> records;
   for (const std::string& table : tables.empty() ? known : tables) {
     std::vector<std::string> columns = db.Columns(table);
     std::vector<Row> rows = db.Rows("SELECT * FROM " + Quote(table) + " ORDER BY rowid");
+    if (format != ViewStyle::kGrid) {
+      for (const Row& row : rows) {
+        Record record = format == ViewStyle::kJson ? Record{{"table", table}} : Record::object();
+        for (size_t i = 0; i < row.size() && i < columns.size(); ++i) {
+          record[columns[i]] = row[i].Json();
+        }
+        records.push_back(record);
+      }
+      if (format == ViewStyle::kCsv) PrintRecords(records, columns, format, out);
+      continue;
+    }
     out << table << ": " << rows.size() << (rows.size() == 1 ? " row\n" : " rows\n");
     for (const Row& row : rows) {
       std::string line;
@@ -322,6 +455,7 @@ void PrintTables(const std::string& dbPath, const std::vector<std::string>& tabl
       out << line << "\n";
     }
   }
+  if (format == ViewStyle::kJson) PrintRecords(records, {}, format, out);
 }
 
 Snapshot TakeSnapshot(const std::string& dbPath) {

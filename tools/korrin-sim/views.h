@@ -32,26 +32,42 @@ struct GridBox {
 std::string BoxLabel(bool isFolder, int boxType, const std::string& appId,
                      const std::string& name);
 
-// Rows of |columns| cells of 16 characters (a longer label ends in "~"), each
+// Rows of |columns| cells 16 terminal columns wide (a wider label is cut and
+// ends in "~"), or with |wide| each column as wide as its widest label; each
 // line indented by |indent|. Boxes outside the grid or on a taken cell are
 // listed under it.
-void PrintGrid(const std::vector<GridBox>& boxes, int columns, int indent, std::ostream& out);
+void PrintGrid(const std::vector<GridBox>& boxes, int columns, int indent, std::ostream& out,
+               bool wide = false);
+
+// How a view prints: as grids (|wide| ones cut no label), or as one record a
+// box (a row for `tables`) for other tools: a JSON array holding one object a
+// line, or CSV (RFC 4180, a header line first).
+struct ViewStyle {
+  enum Format { kGrid, kJson, kCsv } format;
+  bool wide;
+};
 
 // The stored layout of menu |menuId|: each page as a grid, each folder's pages
 // under the page that holds it. |ids| puts each box's id before its label.
-void PrintMenuLayout(const std::string& dbPath, int menuId, bool ids, std::ostream& out);
+// Records have page, pageId, folder (the folder box whose page it is, or
+// null), boxId, col, row, label, appId, name, isFolder and boxType.
+void PrintMenuLayout(const std::string& dbPath, int menuId, bool ids, const ViewStyle& style,
+                     std::ostream& out);
 // The pages of the folder box |boxId|.
-void PrintFolder(const std::string& dbPath, int boxId, bool ids, std::ostream& out);
+void PrintFolder(const std::string& dbPath, int boxId, bool ids, const ViewStyle& style,
+                 std::ostream& out);
 
 // Pages the engine computed (the download and alphabetical views) and the
-// boxes on them, page by page as grids of |columns|.
-void PrintComputedView(const std::vector<boost::shared_ptr<GamePageData> >& pages,
-                       const std::vector<boost::shared_ptr<GameBoxData> >& boxes, int columns,
-                       std::ostream& out);
+// boxes on them, page by page as grids of |columns|, or as records.
+void PrintComputedView(const std::vector<boost::shared_ptr<GamePageData>>& pages,
+                       const std::vector<boost::shared_ptr<GameBoxData>>& boxes, int columns,
+                       const ViewStyle& style, std::ostream& out);
 
-// Every row of the named tables (all tables when |tables| is empty).
+// Every row of the named tables (all tables when |tables| is empty). A JSON
+// record names its table first; CSV takes one table. Throws UsageError for a
+// table that is missing.
 void PrintTables(const std::string& dbPath, const std::vector<std::string>& tables,
-                 std::ostream& out);
+                 ViewStyle::Format format, std::ostream& out);
 
 // Every row of every table, by table and row id: values as text, NULL as
 // NULL, texts quoted.

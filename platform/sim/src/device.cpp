@@ -83,7 +83,7 @@ const std::vector<UsageLog>& Device::UsageLogs() const { return TheState().usage
 
 char* CopyText(const std::string& text) { return strdup(text.c_str()); }
 
-char* CopyText(const std::optional<std::string>& text) {
+char* CopyText(const boost::optional<std::string>& text) {
   return text ? CopyText(*text) : NULL;
 }
 

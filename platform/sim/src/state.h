@@ -12,7 +12,6 @@
 
 #include <functional>
 #include <map>
-#include <optional>
 #include <string>
 #include <unordered_map>
 #include <utility>
@@ -211,7 +210,7 @@ void DeliverPackageEvent(const std::string& type, const std::string& pkgId, int 
 // ---- Strings handed to the caller, who frees them.
 
 char* CopyText(const std::string& text);
-char* CopyText(const std::optional<std::string>& text);  // NULL for none
+char* CopyText(const boost::optional<std::string>& text);  // NULL for none
 
 }  // namespace sim
 

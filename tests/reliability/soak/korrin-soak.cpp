@@ -14,7 +14,6 @@
 #include <iostream>
 #include <map>
 #include <numeric>
-#include <optional>
 #include <random>
 #include <set>
 #include <sstream>
@@ -281,10 +280,10 @@ class Generator {
     uint32_t i = Below(kPool);
     return i == 0 ? "p'q" : i == 1 ? "p\xc3\xa9" : "p" + std::to_string(i);
   }
-  std::optional<std::string> Label() {  // now and then none
+  boost::optional<std::string> Label() {  // now and then none
     std::string label = kLabels[Below(std::size(kLabels))];
     if (OneIn(2)) label += " " + std::to_string(Below(10));
-    return OneIn(20) ? std::nullopt : std::optional<std::string>(label);
+    return OneIn(20) ? boost::none : boost::optional<std::string>(label);
   }
   // Mostly one game; now and then another application, or several.
   sim::Package NewPackage(const std::string& pkgId) {

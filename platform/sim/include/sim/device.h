@@ -14,10 +14,13 @@
 
 #include <functional>
 #include <map>
-#include <optional>
 #include <string>
 #include <utility>
 #include <vector>
+
+// Boost's optional rather than std::optional: a host built as C++11 includes
+// this header too.
+#include <boost/optional.hpp>
 
 namespace sim {
 
@@ -31,8 +34,8 @@ struct LogLine {
 // One application of a package, with every fact the platform reports on it.
 struct App {
   std::string id;
-  std::optional<std::string> label;  // none: the platform gives a null label
-  std::optional<std::string> icon;   // none: a null icon path; "" is an empty one
+  boost::optional<std::string> label;  // none: the platform gives a null label
+  boost::optional<std::string> icon;   // none: a null icon path; "" is an empty one
   std::string type = "capp";         // app_info_get_type
   bool game = false;                 // app_info_is_game
   bool noDisplay = false;
