@@ -275,6 +275,7 @@ for (const form of document.querySelectorAll('form[data-command]')) {
       update: () => `update ${quote(f.pkgId)}` + (f.label ? ' ' + quote(f.label) : ''),
       uninstall: () => `uninstall ${quote(f.pkgId)}`,
       fail: () => `fail ${quote(f.call)} ${f.error ? quote(f.error) : ''} ${f.when}`.replace(/\s+/g, ' '),
+      event: () => `event ${f.type} ${f.state} ${quote(f.pkgId)}`,
       raw: () => f.line,
     };
     run(lines[command]());
