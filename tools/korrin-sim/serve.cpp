@@ -1,8 +1,12 @@
 #include "serve.h"
 
 #include <httplib.h>
+#include <pthread.h>
+#include <signal.h>
+#include <unistd.h>
 #include <sqlite3.h>
 
+#include <atomic>
 #include <chrono>
 #include <condition_variable>
 #include <fstream>
@@ -10,6 +14,7 @@
 #include <mutex>
 #include <set>
 #include <sstream>
+#include <thread>
 
 #include <nlohmann/json.hpp>
 
@@ -355,6 +360,12 @@ int Serve(Session& session, const ServeOptions& options) {
     if (!in || !session.RunScript(script, options.script, std::cerr)) return 1;
   }
   httplib::Server http;
+  // cpp-httplib's default also sets SO_REUSEPORT, which lets a second server
+  // take a port already served: a port in use must be refused instead.
+  http.set_socket_options([](socket_t sock) {
+    int yes = 1;
+    setsockopt(sock, SOL_SOCKET, SO_REUSEADDR, &yes, sizeof yes);
+  });
   Server server(session, prelude);
   server.Route(http);
   int port = options.port;
@@ -364,12 +375,32 @@ int Serve(Session& session, const ServeOptions& options) {
     port = -1;
   }
   if (port < 0) {
-    std::cerr << "korrin-sim serve: cannot listen on 127.0.0.1:" << options.port << "\n";
+    std::cerr << "korrin-sim serve: cannot listen on 127.0.0.1:" << options.port
+              << " (is the port in use? --port 0 takes any free one)\n";
     return 1;
   }
   std::cout << "korrin-sim serve: http://127.0.0.1:" << port
             << "/ (the loopback address only; Ctrl-C stops)" << std::endl;
-  return http.listen_after_bind() ? 0 : 1;
+  // Ctrl-C or a TERM stops the server, so that the device root is left as
+  // the other modes leave it: one thread waits for the signal, which every
+  // other thread (the server's too) blocks.
+  sigset_t stopSignals, before;
+  sigemptyset(&stopSignals);
+  sigaddset(&stopSignals, SIGINT);
+  sigaddset(&stopSignals, SIGTERM);
+  pthread_sigmask(SIG_BLOCK, &stopSignals, &before);
+  std::atomic<bool> signalled(false);
+  std::thread waiter([&] {
+    int signal = 0;
+    sigwait(&stopSignals, &signal);
+    signalled = true;
+    http.stop();
+  });
+  bool served = http.listen_after_bind();
+  if (!signalled) kill(getpid(), SIGTERM);  // wakes the waiter: the server ended by itself
+  waiter.join();
+  pthread_sigmask(SIG_SETMASK, &before, NULL);
+  return served ? 0 : 1;
 }
 
 }  // namespace korrin_sim
