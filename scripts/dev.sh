@@ -1,6 +1,9 @@
 #!/usr/bin/env bash
 # Sets up a Debian 12 machine for the engine, builds it, and runs one thing:
 #   scripts/dev.sh demo       the simulator's demo
+#   scripts/dev.sh serve [ARGS]
+#                             the demo's phone in a browser (korrin-sim serve;
+#                             ARGS such as --port N go to it)
 #   scripts/dev.sh test       the whole test suite
 #   scripts/dev.sh sanitize   the whole test suite under ASan and UBSan
 #   scripts/dev.sh bench [ARGS]
@@ -24,7 +27,7 @@ cd "$(dirname "$0")/.."
 # Boost.Program_options, libedit, dtl and nlohmann-json (the views as JSON);
 # the tests GoogleTest and GoogleMock.
 packages=(g++ make cmake pkg-config libsqlite3-dev libboost-dev libboost-program-options-dev
-          libedit-dev libdtl-dev nlohmann-json3-dev libgtest-dev libgmock-dev)
+          libedit-dev libdtl-dev nlohmann-json3-dev libcpp-httplib-dev libgtest-dev libgmock-dev)
 
 install_missing_packages() {
   local missing=() p
@@ -105,22 +108,41 @@ prepare_arm_sysroot() {
   echo "$made_from" >"$sysroot/.made-from"
 }
 
+# Only korrin-sim, quietly, for the demos: cmake's output goes to a log shown
+# on failure.
+build_korrin_sim_quietly() {
+  install_missing_packages
+  mkdir -p build
+  echo "dev.sh: building korrin-sim (log in build/demo-build.log)" >&2
+  if ! { cmake -S . -B build && cmake --build build -j"$(nproc)" --target korrin-sim; } \
+      >build/demo-build.log 2>&1; then
+    tail -n 40 build/demo-build.log >&2
+    echo "dev.sh: the build failed; the whole log is build/demo-build.log" >&2
+    exit 1
+  fi
+}
+
+# The browser tests drive Debian's chromium with playwright-core from npm,
+# pinned by tests/serve/package-lock.json; npm itself from Debian when the
+# machine has none.
+install_browser_driver() {
+  command -v npm >/dev/null || install_missing_packages nodejs npm
+  [ -d tests/serve/node_modules/playwright-core ] ||
+    npm ci --prefix tests/serve --no-audit --no-fund >/dev/null
+}
+
 case "${1:-}" in
   demo)
-    install_missing_packages
-    # Only korrin-sim, quietly: cmake's output goes to a log shown on failure.
-    mkdir -p build
-    echo "dev.sh: building korrin-sim (log in build/demo-build.log)" >&2
-    if ! { cmake -S . -B build && cmake --build build -j"$(nproc)" --target korrin-sim; } \
-        >build/demo-build.log 2>&1; then
-      tail -n 40 build/demo-build.log >&2
-      echo "dev.sh: the build failed; the whole log is build/demo-build.log" >&2
-      exit 1
-    fi
+    build_korrin_sim_quietly
     exec build/tools/korrin-sim/korrin-sim demo
     ;;
+  serve)
+    build_korrin_sim_quietly
+    exec build/tools/korrin-sim/korrin-sim serve --script tools/korrin-sim/demo.ksim "${@:2}"
+    ;;
   test)
-    install_missing_packages "${fuzz_packages[@]}" rpm
+    install_missing_packages "${fuzz_packages[@]}" rpm chromium
+    install_browser_driver
     build build
     run_tests build
     bash packaging/check-spec.sh

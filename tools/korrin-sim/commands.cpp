@@ -780,6 +780,7 @@ void PrintCommandList(std::ostream& out) {
          "       korrin-sim shell [--root DIR | --keep]\n"
          "       korrin-sim open FILE [SCRIPT...] [--in-place] [--root DIR | --keep]\n"
          "       korrin-sim COMMAND [ARG...] [--db FILE [--in-place]]\n"
+         "       korrin-sim serve [--root DIR | --db FILE] [--port N] [--script FILE]\n"
          "       korrin-sim help [COMMAND]\n"
          "       korrin-sim --version\n\n"
          "Without --root, the device lives in a fresh folder under $TMPDIR (/tmp),\n"
@@ -790,6 +791,10 @@ void PrintCommandList(std::ostream& out) {
          "a copy, or with --in-place on FILE itself; `start` opens it in the engine.\n"
          "A COMMAND alone runs once, with --db on a copy of FILE: `korrin-sim check\n"
          "--db phone.db` exits 1 when it finds a problem.\n"
+         "`serve` shows the phone's home screen in a browser, live, on 127.0.0.1\n"
+         "only (default port 8080): events, edits and the log, each edit also\n"
+         "shown as the command that makes it; `serve --script tools/korrin-sim/\n"
+         "demo.ksim` serves the demo.\n"
          "Scripts hold one command per line; # starts a comment line. Words split\n"
          "as in the POSIX shell, nothing expanded: `help quoting`.\n\n"
          "commands:\n";

@@ -27,6 +27,7 @@
 #include "demo.h"
 #include "device-state.h"
 #include "phone-db.h"
+#include "serve.h"
 #include "session.h"
 #include "sim/device.h"
 #include "words.h"
@@ -240,6 +241,21 @@ bool ReadLine(const char* prompt, std::string& line) {
   return true;
 }
 
+int Serve(DeviceRoot root, const korrin_sim::ServeOptions& options, const Opened* opened) {
+#ifdef KORRIN_SIM_SERVE
+  if (!UseDeviceRoot(root)) return 1;
+  if (!Place(opened)) return Leave(root, 1);
+  korrin_sim::Session session;
+  return Leave(root, korrin_sim::Serve(session, options));
+#else
+  (void)root;
+  (void)options;
+  (void)opened;
+  std::cerr << "korrin-sim: this build has no `serve` (it was built without cpp-httplib)\n";
+  return 2;
+#endif
+}
+
 int Shell(DeviceRoot root, const Opened* opened = NULL) {
   if (!UseDeviceRoot(root)) return 1;
   if (!Place(opened)) return Leave(root, 1);
@@ -358,8 +374,13 @@ int main(int argc, char** argv) {
   visible.add_options()("root", po::value<std::string>()->value_name("DIR"),
                         "keep the device (its phone and database) in DIR")(
       "keep", "keep the temporary device folder at exit")(
-      "in-place", "open: change FILE itself, not a copy")("help", "list the commands")(
-      "version", "print korrin-sim's version and the library's");
+      "in-place", "open: change FILE itself, not a copy")(
+      "db", po::value<std::string>()->value_name("FILE"),
+      "serve: show a phone's layout database FILE (on a copy, as open does)")(
+      "port", po::value<int>()->default_value(8080)->value_name("N"),
+      "serve: the port on 127.0.0.1 (0: any free one)")(
+      "script", po::value<std::string>()->value_name("FILE"), "serve: play FILE first")(
+      "help", "list the commands")("version", "print korrin-sim's version and the library's");
   po::options_description all;
   all.add(visible).add_options()("mode", po::value<std::string>()->default_value("demo"))(
       "files", po::value<std::vector<std::string> >());
@@ -371,7 +392,9 @@ int main(int argc, char** argv) {
     po::notify(values);
   } catch (const po::unknown_option& e) {
     std::cerr << "korrin-sim: unknown option '" << e.get_option_name() << "'"
-              << korrin_sim::DidYouMean(e.get_option_name(), {"--root", "--keep", "--in-place", "--help", "--version"})
+              << korrin_sim::DidYouMean(e.get_option_name(), {"--root", "--keep", "--in-place", "--db",
+                                                              "--port", "--script", "--help",
+                                                              "--version"})
               << " (korrin-sim --help)\n";
     return 2;
   } catch (const po::error& e) {
@@ -400,9 +423,9 @@ int main(int argc, char** argv) {
     std::vector<std::string> scripts(files.begin() + 1, files.end());
     return scripts.empty() ? Shell(root, &opened) : Run(root, scripts, &opened);
   }
-  if (mode != "demo" && mode != "shell") {
+  if (mode != "demo" && mode != "shell" && mode != "serve") {
     std::cerr << "korrin-sim: unknown mode '" << mode << "'"
-              << korrin_sim::DidYouMean(mode, {"demo", "run", "shell", "open", "help"})
+              << korrin_sim::DidYouMean(mode, {"demo", "run", "shell", "open", "serve", "help"})
               << " (korrin-sim --help)\n";
     return 2;
   }
@@ -410,6 +433,13 @@ int main(int argc, char** argv) {
     std::cerr << "korrin-sim: " << mode << " takes no more words: '" << files[0]
               << "' (korrin-sim --help)\n";
     return 2;
+  }
+  if (mode == "serve") {
+    korrin_sim::ServeOptions serve;
+    serve.port = values["port"].as<int>();
+    if (values.count("script")) serve.script = values["script"].as<std::string>();
+    Opened opened{values.count("db") ? values["db"].as<std::string>() : "", false};
+    return Serve(root, serve, values.count("db") ? &opened : NULL);
   }
   return mode == "demo" ? Demo(root) : Shell(root);
 }

@@ -159,29 +159,6 @@ bool IsComment(const std::string& line) {
   return first != std::string::npos && line[first] == '#';
 }
 
-// Whether the engine wrote |line| as a failure. The engine logs much at error
-// priority that is only information ("#Step 1", "Name[...]", "appId[...]"), so
-// a line counts only when its message says that something went wrong.
-bool FailureLogged(const sim::LogLine& line) {
-  static const char* const kMarkers[] = {"error", "fail", "cannot", "invalid", "err :",
-                                         "return [", "no page [", "no box ["};
-  if (line.priority < DLOG_ERROR) return false;
-  size_t prefix = line.text.find(") >  ");
-  std::string text = line.text.substr(prefix == std::string::npos ? 0 : prefix + 5);
-  std::transform(text.begin(), text.end(), text.begin(),
-                 [](unsigned char c) { return std::tolower(c); });
-  // Information in a failure's words: a call that worked and said no (its
-  // code 0: "app_info_is_game FAILED [0] [0]" for an application that is no
-  // game), and the look-up every install makes before placing a new box.
-  static const char* const kNotFailures[] = {"failed [0]", "cannot find box with appid"};
-  for (const char* words : kNotFailures) {
-    if (text.find(words) != std::string::npos) return false;
-  }
-  for (const char* marker : kMarkers) {
-    if (text.find(marker) != std::string::npos) return true;
-  }
-  return false;
-}
 
 bool IsNameStart(char c) { return std::isalpha(static_cast<unsigned char>(c)) != 0; }
 bool IsNameChar(char c) { return std::isalnum(static_cast<unsigned char>(c)) != 0 || c == '_'; }

@@ -1,5 +1,7 @@
 #include "views.h"
 
+#include <ctype.h>
+#include <dlog.h>
 #include <sqlite3.h>
 #include <stdlib.h>
 
@@ -526,6 +528,27 @@ int ParsePriority(const std::string& letter) {
 void PrintLogLine(const sim::LogLine& line, bool messageOnly, std::ostream& out) {
   std::string text = messageOnly ? Message(line.text) : line.text;
   out << PriorityLetter(line.priority) << "/" << line.tag << ": " << OneLine(text) << "\n";
+}
+
+bool FailureLogged(const sim::LogLine& line) {
+  static const char* const kMarkers[] = {"error", "fail", "cannot", "invalid", "err :",
+                                         "return [", "no page [", "no box ["};
+  if (line.priority < DLOG_ERROR) return false;
+  size_t prefix = line.text.find(") >  ");
+  std::string text = line.text.substr(prefix == std::string::npos ? 0 : prefix + 5);
+  std::transform(text.begin(), text.end(), text.begin(),
+                 [](unsigned char c) { return std::tolower(c); });
+  // Information in a failure's words: a call that worked and said no (its
+  // code 0: "app_info_is_game FAILED [0] [0]" for an application that is no
+  // game), and the look-up every install makes before placing a new box.
+  static const char* const kNotFailures[] = {"failed [0]", "cannot find box with appid"};
+  for (const char* words : kNotFailures) {
+    if (text.find(words) != std::string::npos) return false;
+  }
+  for (const char* marker : kMarkers) {
+    if (text.find(marker) != std::string::npos) return true;
+  }
+  return false;
 }
 
 }  // namespace korrin_sim

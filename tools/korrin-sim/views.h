@@ -89,6 +89,10 @@ int ParsePriority(const std::string& letter);
 // |line| as "P/tag: text", a newline in the text as \n; |messageOnly| leaves
 // out the engine's "file: function(line) >  " prefix.
 void PrintLogLine(const sim::LogLine& line, bool messageOnly, std::ostream& out);
+// Whether the engine wrote |line| as a failure. The engine logs much at error
+// priority that is only information ("#Step 1", "Name[...]", "appId[...]"), so
+// a line counts only when its message says that something went wrong.
+bool FailureLogged(const sim::LogLine& line);
 
 }  // namespace korrin_sim
 
