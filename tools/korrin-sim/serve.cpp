@@ -299,8 +299,12 @@ class Server {
   }
 
   void Command(const httplib::Request& req, httplib::Response& res) {
-    json body = json::parse(req.body, nullptr, /*allow_exceptions=*/false);
-    if (body.is_discarded()) return Reply(res, 400, ErrorJson("the body is not JSON"));
+    json body;
+    try {
+      body = json::parse(req.body);
+    } catch (const json::parse_error& e) {
+      return Reply(res, 400, ErrorJson(std::string("the body is not JSON: ") + e.what()));
+    }
     if (!body.is_object() || !body.contains("line") || !body["line"].is_string()) {
       return Reply(res, 400, ErrorJson("the body must be {\"line\": \"COMMAND ...\"}"));
     }
