@@ -196,7 +196,7 @@ std::vector<Finding> CheckDatabase(const Connection& db) {
   std::vector<Finding> findings;
   auto add = [&](const std::string& text) { findings.push_back(Finding{text, 0, 0}); };
   Connection store(":memory:", false);
-  store.Exec(kLayoutSchema);
+  CreateStoreTables(store);
   for (const char* table : {"Menus", "Pages", "Boxes"}) {
     std::vector<std::string> want = Columns(store, table), have = Columns(db, table);
     if (have.empty()) {

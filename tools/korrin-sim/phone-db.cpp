@@ -18,6 +18,7 @@
 #include "cli.h"
 #include "commands.h"
 #include "common/device-path.h"
+#include "launcher-data-manager/launcher-data-manager.h"
 #include "session.h"
 
 namespace po = boost::program_options;
@@ -25,18 +26,14 @@ namespace fs = std::filesystem;
 
 namespace korrin_sim {
 
-// Kept as the store's own schema text makes the tables: check compares a
-// database with it, and import makes new ones from it.
-const char kLayoutSchema[] =
-    "PRAGMA journal_mode = PERSIST;"
-    "create table if not exists Menus( menuId INTEGER PRIMARY KEY AUTOINCREMENT, name TEXT, "
-    "type INTEGER );"
-    "create table if not exists Pages( pageId INTEGER PRIMARY KEY AUTOINCREMENT, isFolder "
-    "INTEGER, parentId INTEGER, pageNo INTEGER );"
-    "create table if not exists Boxes( boxId INTEGER PRIMARY KEY AUTOINCREMENT, isFolder "
-    "INTEGER, pageParentId INTEGER, pageId INTEGER, appId TEXT, name TEXT, col INTEGER, row "
-    "INTEGER, isPreload INTEGER, isSystem INTEGER, boxType INTEGER, launchType INTEGER, "
-    "iconPath TEXT, content TEXT );";
+// The schema stays the store's: a store of korrin-sim's own, which opens
+// nothing, runs its schema on |db|.
+void CreateStoreTables(const Connection& db) {
+  LauncherDataManager store;
+  store.m_db = db.get();
+  store._CreateTables();
+  store.m_db = NULL;  // |db| is not the store's to close
+}
 
 namespace {
 
@@ -304,7 +301,7 @@ class RecordLines : public nlohmann::json_sax<Json> {
 // The columns of the store's tables and their declared types.
 std::map<std::string, std::map<std::string, std::string> > SchemaColumns() {
   Connection scratch(":memory:", false);
-  scratch.Exec(kLayoutSchema);
+  CreateStoreTables(scratch);
   std::map<std::string, std::map<std::string, std::string> > tables;
   for (const TableName& t : kTables) {
     for (const Json& c : scratch.Rows(std::string("PRAGMA table_info(") + t.table + ")")) {
@@ -444,7 +441,7 @@ void RunImport(Session& session, const Args& args) {
     fs::remove(target + "-journal");
   }
   Connection db(target, false);
-  db.Exec(kLayoutSchema);
+  CreateStoreTables(db);
   db.Exec("BEGIN IMMEDIATE");
   try {
     for (const TableName& t : kTables) db.Exec(std::string("DELETE FROM ") + t.table);

@@ -46,8 +46,9 @@ class Connection {
   sqlite3* db_;
 };
 
-// The tables and columns the store makes, as its schema makes them.
-extern const char kLayoutSchema[];
+// Makes the store's tables in |db| with the store's own schema (and its
+// journal mode): the tables check compares with and import fills.
+void CreateStoreTables(const Connection& db);
 
 // ---- Layouts as rows.
 
