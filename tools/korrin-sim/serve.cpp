@@ -4,7 +4,6 @@
 #include <pthread.h>
 #include <signal.h>
 #include <unistd.h>
-#include <sqlite3.h>
 
 #include <atomic>
 #include <chrono>
@@ -20,6 +19,7 @@
 
 #include "cli.h"
 #include "korrin-data/korrin-data.h"
+#include "phone-db.h"
 #include "serve-page.h"
 #include "session.h"
 #include "views.h"
@@ -45,48 +45,34 @@ const std::chrono::seconds kPollWait(20);
 
 // ---- Reading the layout database, as the launcher's screen would.
 
-class Reader {
- public:
-  explicit Reader(const std::string& path) : db_(NULL) {
-    if (sqlite3_open_v2(path.c_str(), &db_, SQLITE_OPEN_READONLY, NULL) != SQLITE_OK) {
-      sqlite3_close(db_);
-      db_ = NULL;
-    }
-  }
-  ~Reader() { sqlite3_close(db_); }
-
-  // Each row of |sql| as a JSON array of its values (NULL as null).
-  std::vector<json> Rows(const char* sql) const {
-    std::vector<json> rows;
-    sqlite3_stmt* stmt = NULL;
-    if (db_ == NULL || sqlite3_prepare_v2(db_, sql, -1, &stmt, NULL) != SQLITE_OK) return rows;
-    while (sqlite3_step(stmt) == SQLITE_ROW) {
-      json row = json::array();
-      for (int c = 0; c < sqlite3_column_count(stmt); ++c) row.push_back(Value(stmt, c));
-      rows.push_back(std::move(row));
-    }
-    sqlite3_finalize(stmt);
-    return rows;
-  }
-
- private:
-  static json Value(sqlite3_stmt* stmt, int c) {
-    switch (sqlite3_column_type(stmt, c)) {
-      case SQLITE_NULL:
-        return nullptr;
-      case SQLITE_INTEGER:
-        return sqlite3_column_int64(stmt, c);
-      default:
-        const unsigned char* text = sqlite3_column_text(stmt, c);
-        return std::string(reinterpret_cast<const char*>(text), sqlite3_column_bytes(stmt, c));
-    }
-  }
-
-  sqlite3* db_;
+// The layout's rows, or none when the database cannot be read (the engine
+// has not made it yet, say): an empty phone.
+struct LayoutRows {
+  std::vector<Json> menus, pages, boxes;
 };
 
-std::string Text(const json& value) { return value.is_string() ? value.get<std::string>() : ""; }
-int Int(const json& value) { return value.is_number_integer() ? value.get<int>() : 0; }
+LayoutRows ReadLayoutRows(const std::string& dbPath) {
+  LayoutRows rows;
+  try {
+    Connection db(dbPath, /*readOnly=*/true);
+    rows.menus = db.Rows("SELECT menuId, name FROM Menus ORDER BY menuId");
+    rows.pages = db.Rows("SELECT pageId, isFolder, parentId, pageNo FROM Pages "
+                         "ORDER BY pageNo, pageId");
+    rows.boxes = db.Rows("SELECT boxId, isFolder, pageId, appId, name, col, row, boxType "
+                         "FROM Boxes ORDER BY row, col, boxId");
+  } catch (const UsageError&) {
+  }
+  return rows;
+}
+
+template <typename J>
+std::string Text(const J& value) {
+  return value.is_string() ? value.template get<std::string>() : "";
+}
+template <typename J>
+int Int(const J& value) {
+  return value.is_number_integer() ? value.template get<int>() : 0;
+}
 
 // The phone's applications by id, with whether their package is deactivated.
 class AppIndex {
@@ -131,26 +117,26 @@ json BoxJson(const AppIndex& apps, int id, bool isFolder, int boxType, const std
 
 // Menus with their pages, and folders with theirs, each page with its boxes.
 json LayoutJson(const std::string& dbPath, const AppIndex& apps) {
-  Reader db(dbPath);
+  LayoutRows rows = ReadLayoutRows(dbPath);
   std::map<int, json> pages;  // pageId -> page
-  for (const json& p : db.Rows("SELECT pageId, isFolder, parentId, pageNo FROM Pages "
-                               "ORDER BY pageNo, pageId")) {
-    pages[Int(p[0])] = {{"id", Int(p[0])}, {"folder", Int(p[1]) != 0}, {"parent", Int(p[2])},
-                        {"no", Int(p[3])}, {"boxes", json::array()}};
+  for (const Json& p : rows.pages) {
+    pages[Int(p["pageId"])] = {{"id", Int(p["pageId"])}, {"folder", Int(p["isFolder"]) != 0},
+                               {"parent", Int(p["parentId"])}, {"no", Int(p["pageNo"])},
+                               {"boxes", json::array()}};
   }
-  for (const json& b : db.Rows("SELECT boxId, isFolder, pageId, appId, name, col, row, boxType "
-                               "FROM Boxes ORDER BY row, col, boxId")) {
-    std::map<int, json>::iterator page = pages.find(Int(b[2]));
+  for (const Json& b : rows.boxes) {
+    std::map<int, json>::iterator page = pages.find(Int(b["pageId"]));
     if (page == pages.end()) continue;  // a box without a page is not on any screen
-    page->second["boxes"].push_back(
-        BoxJson(apps, Int(b[0]), Int(b[1]) != 0, Int(b[7]), Text(b[3]), Text(b[4]), Int(b[5]), Int(b[6])));
+    page->second["boxes"].push_back(BoxJson(apps, Int(b["boxId"]), Int(b["isFolder"]) != 0,
+                                            Int(b["boxType"]), Text(b["appId"]), Text(b["name"]),
+                                            Int(b["col"]), Int(b["row"])));
   }
   json menus = json::array();
   json folders = json::object();
-  for (const json& m : db.Rows("SELECT menuId, name FROM Menus ORDER BY menuId")) {
-    json menu = {{"id", Int(m[0])}, {"name", Text(m[1])}, {"pages", json::array()}};
+  for (const Json& m : rows.menus) {
+    json menu = {{"id", Int(m["menuId"])}, {"name", Text(m["name"])}, {"pages", json::array()}};
     for (std::pair<const int, json>& page : pages) {
-      if (!page.second["folder"] && page.second["parent"] == Int(m[0])) {
+      if (!page.second["folder"] && page.second["parent"] == Int(m["menuId"])) {
         menu["pages"].push_back(page.second);
       }
     }
