@@ -347,7 +347,13 @@ int Serve(Session& session, const ServeOptions& options) {
     text << in.rdbuf();
     prelude = text.str();
     std::istringstream script(prelude);
-    if (!in || !session.RunScript(script, options.script, std::cerr)) return 1;
+    // What the script prints is the page's to show: only its errors reach the terminal.
+    std::ostringstream printed;
+    SetOut(&printed);
+    bool played = in && session.RunScript(script, options.script, std::cerr);
+    SetOut(NULL);
+    if (!played) return 1;
+    std::cout << "korrin-sim serve: played " << options.script << "\n";
   }
   httplib::Server http;
   // cpp-httplib's default also sets SO_REUSEPORT, which lets a second server
