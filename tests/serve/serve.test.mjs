@@ -21,7 +21,7 @@ before(async () => {
   browser = await chromium.launch({ executablePath: CHROMIUM });
   page = await browser.newPage({ viewport: { width: 1100, height: 800 } });
   await page.goto(url);
-  await page.waitForSelector('.box');
+  await page.waitForSelector('#screen .box');  // drawn from the state, not the legend's samples
 });
 after(async () => { await browser?.close(); server?.kill(); });
 
