@@ -30,13 +30,16 @@ void Die(const std::string& message) {
   abort();
 }
 
-// Views (tables, trace) tell nothing of the engine; layout and folder draw a
-// hostile layout (a box at row 2^31, a folder in itself) for ever.
-// A release made to fail leaves its handle open for good. (Names are never quoted.)
+// Views tell nothing of the engine; commands that name a file would read or
+// write the machine's. A release made to fail leaves its handle open for good.
+// (Names are never quoted.)
 std::string Refused(std::string line) {
   std::istringstream words(line);
   for (std::string w; words >> w;) {
     if (w == "layout" || w == "folder" || w == "tables" || w == "trace") return "a view";
+    for (const char* file : {"save", "load", "export", "import", "replay-log"}) {
+      if (w == file) return "a file";
+    }
   }
   line.erase(std::remove_if(line.begin(), line.end(), [](char c) { return strchr("\"'\\", c); }),
              line.end());
