@@ -277,6 +277,7 @@ class Server {
       state["view"] = ComputedViewJson(apps, req.get_param_value("view"));
     }
     state["apps"] = AppsJson();
+    state["calls"] = sim::Device::PlatformCalls();  // for the fault form
     state["log"] = LogJson();
     state["changes"] = changes_;
     state["commands"] = commands_;

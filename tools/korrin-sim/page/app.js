@@ -179,6 +179,8 @@ function render() {
     select.innerHTML = packages.map(p => `<option>${escape(p)}</option>`).join('');
     if (packages.includes(chosen)) select.value = chosen;
   }
+  const calls = document.getElementById('calls');
+  if (!calls.childElementCount) calls.innerHTML = state.calls.map(c => `<option value="${escape(c)}">`).join('');
   document.getElementById('commands').textContent = state.commands.join('\n');
   document.getElementById('changes').textContent = state.changes;
   const log = document.getElementById('log');
