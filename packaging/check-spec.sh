@@ -1,6 +1,6 @@
 #!/usr/bin/env bash
 # Checks packaging/korrin-data.spec against CMake's own rules for the device build:
-# the spec parses; its Version is the one written into korrin-data.pc; its
+# the recipe parses; its Version is the one written into korrin-data.pc; its
 # pkgconfig() BuildRequires are the modules that .pc file requires; its %files
 # name every file the install puts down and nothing more (%dir entries must be
 # directories it makes), and each %files carries the manifest.
@@ -27,7 +27,7 @@ PKG_CONFIG_PATH="$work/pc" cmake -S . -B "$work/build" -DKORRIN_PLATFORM=tizen -
   -DCMAKE_INSTALL_PREFIX="$(rpm -E %_prefix)" -DCMAKE_INSTALL_LIBDIR="$(rpm -E %_libdir)" \
   -DCMAKE_INSTALL_INCLUDEDIR="$(rpm -E %_includedir)" >"$work/configure.log" 2>&1 || {
   cat "$work/configure.log" >&2
-  bad "KORRIN_PLATFORM=tizen does not configure with the spec's pkgconfig() BuildRequires"
+  bad "KORRIN_PLATFORM=tizen does not configure with the recipe's pkgconfig() BuildRequires"
   exit 1
 }
 grep -o "\"$work/build/[^\"\$]*\"" "$work/build/cmake_install.cmake" | tr -d '"' |

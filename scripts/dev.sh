@@ -18,7 +18,7 @@
 #                             the fuzzer for SECONDS (default 600), keeping what it
 #                             finds in build-fuzz/work (or $KORRIN_FUZZ_WORK)
 # `test` also builds the fuzzer with clang and gives it a short, fixed run, and
-# checks the device package's spec (packaging/check-spec.sh, with rpm's rpmspec).
+# checks the device package's recipe (packaging/check-spec.sh, with rpm's rpmspec).
 # Missing Debian packages are installed with apt-get (as root) only when missing.
 set -euo pipefail
 cd "$(dirname "$0")/.."
