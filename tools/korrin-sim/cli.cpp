@@ -90,10 +90,10 @@ const std::vector<std::string> kEventStateNames = {"started", "processing", "com
                                                    "failed"};
 const std::vector<std::string> kComponentNames = {"all", "ui", "service"};
 
-std::string Quote(const std::string& text) {
-  std::string out = "\"";
+std::string Escaped(const std::string& text, char quote) {
+  std::string out;
   for (unsigned char c : text) {
-    if (c == '"' || c == '\\') {
+    if (c == quote || c == '\\') {
       out += '\\';
       out += static_cast<char>(c);
     } else if (c == '\n') {
@@ -108,7 +108,9 @@ std::string Quote(const std::string& text) {
       out += static_cast<char>(c);
     }
   }
-  return out + "\"";
+  return out;
 }
+
+std::string Quote(const std::string& text) { return "\"" + Escaped(text, '"') + "\""; }
 
 }  // namespace korrin_sim

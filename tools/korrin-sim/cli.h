@@ -49,6 +49,9 @@ extern const std::vector<std::string> kComponentNames;   // package_info_app_com
 // A text value as results print it: in double quotes, with \" and \\ escaped
 // and other bytes below 0x20 as \n, \t or \xHH.
 std::string Quote(const std::string& text);
+// |text| with |quote| and backslashes escaped by a backslash, and control bytes
+// as \n, \t or \xHH: the inside of Quote's quotes, or of a $'...' word.
+std::string Escaped(const std::string& text, char quote);
 
 }  // namespace korrin_sim
 

@@ -132,25 +132,7 @@ std::string ShellWord(const std::string& text) {
     for (char c : text) word += c == '\'' ? std::string("'\\''") : std::string(1, c);
     return word + "'";
   }
-  std::string word = "$'";
-  for (char c : text) {
-    unsigned char byte = static_cast<unsigned char>(c);
-    if (c == '\\' || c == '\'') {
-      word += '\\';
-      word += c;
-    } else if (c == '\n') {
-      word += "\\n";
-    } else if (c == '\t') {
-      word += "\\t";
-    } else if (byte < 0x20 || byte == 0x7f) {
-      char hex[5];
-      snprintf(hex, sizeof hex, "\\x%02x", byte);
-      word += hex;
-    } else {
-      word += c;
-    }
-  }
-  return word + "'";
+  return "$'" + Escaped(text, '\'') + "'";
 }
 
 std::string DidYouMean(const std::string& word, const std::vector<std::string>& known) {
